@@ -1,0 +1,206 @@
+// The program's folders: resolving the shared base path and the resource path from both
+// roots' "DataPath" keys, saving the user's shared folder, and finding the resources
+// without any set-up.
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+#include <filesystem>
+
+#include "platform/registry.h"
+#include "platform/ui.h"
+#include "shell/paths.h"
+#include "shell/quitFlag.h"
+#include "shell/settings.h"
+#include "support/testSupport.h"
+
+namespace fs = std::filesystem;
+
+class PathsTest : public ::testing::Test {
+protected:
+    void SetUp() override {
+        savedPaths = paths;
+        const char* old = std::getenv("MELODRIFT_CONFIG_DIR");
+        savedConfig = old ? old : "";
+        config = folder.file("config/");
+        setenv("MELODRIFT_CONFIG_DIR", config.c_str(), 1);
+        resetRegistry();
+        resetSettings();
+        clearUiCalls();
+        quitFlag = 0;
+        start = folder.file("start/");
+        setInitialDirectory(start);
+    }
+    void TearDown() override {
+        paths = savedPaths;
+        setenv("MELODRIFT_CONFIG_DIR", savedConfig.c_str(), 1);
+        resetRegistry();
+        resetSettings();
+        clearUiCalls();
+        quitFlag = 0;
+    }
+    std::string machineFile() const { return config + "machine.reg"; }
+    std::string userFile() const { return config + "user.reg"; }
+    void writeRoot(const std::string& file, const std::string& dataPathValues) {
+        fs::create_directories(config);
+        writeFileText(file, "Melodrift Settings Version 1\n[SOFTWARE\\Torvellan\\Melodrift\\1.0\\DataPath]\n" +
+                                dataPathValues);
+    }
+    static bool hasLine(const std::string& text, const std::string& line) {
+        return ("\n" + text).find("\n" + line + "\n") != std::string::npos;
+    }
+
+    TempFolder folder;
+    std::string config;
+    std::string savedConfig;
+    std::string start;   // the initial directory of these tests
+    Paths savedPaths;
+};
+
+// ---- resolving the paths ----
+
+using PathsDataPath = PathsTest;
+
+TEST_F(PathsDataPath, TheFirstStartWritesTheInitialDirectoryAsBothPaths) {
+    ASSERT_EQ(loadDataPaths(), 1);
+    EXPECT_EQ(paths.resourcePath, start);
+    EXPECT_EQ(paths.sharedBasePath, start);
+    EXPECT_EQ(paths.sharedFolder, start + "Torvellan Shared/");
+    std::string text = readFileText(machineFile());
+    EXPECT_NE(text.find("\n[SOFTWARE\\Torvellan\\Melodrift\\1.0\\DataPath]\n"
+                        "\"ResourcePath\"=\"" + start + "\"\n"
+                        "\"TorvellanSharedPath\"=\"" + start + "\"\n"),
+              std::string::npos);
+    EXPECT_FALSE(fs::exists(userFile()));
+    EXPECT_EQ(messageCount(), 0);
+}
+
+TEST_F(PathsDataPath, AnExistingKeyKeepsItsPathsWhenStartedElsewhere) {
+    ASSERT_EQ(loadDataPaths(), 1);
+    setInitialDirectory(folder.file("elsewhere"));
+    resetRegistry();
+    ASSERT_EQ(loadDataPaths(), 1);
+    EXPECT_EQ(paths.initialDirectory, folder.file("elsewhere/"));
+    EXPECT_EQ(paths.resourcePath, start);
+    EXPECT_EQ(paths.sharedBasePath, start);
+}
+
+TEST_F(PathsDataPath, StoredPathsWithoutATrailingSlashAreUsedWithOne) {
+    writeRoot(machineFile(), "\"ResourcePath\"=\"/opt/melodrift\"\n\"TorvellanSharedPath\"=\"/var/data\"\n");
+    ASSERT_EQ(loadDataPaths(), 1);
+    EXPECT_EQ(paths.resourcePath, "/opt/melodrift/");
+    EXPECT_EQ(paths.sharedBasePath, "/var/data/");
+    EXPECT_EQ(paths.sharedFolder, "/var/data/Torvellan Shared/");
+}
+
+TEST_F(PathsDataPath, AnEmptyOrMissingPathIsSetToTheInitialDirectoryAndWrittenBack) {
+    writeRoot(machineFile(), "\"ResourcePath\"=\"\"\n");
+    ASSERT_EQ(loadDataPaths(), 1);
+    EXPECT_EQ(paths.resourcePath, start);
+    EXPECT_EQ(paths.sharedBasePath, start);
+    std::string text = readFileText(machineFile());
+    EXPECT_TRUE(hasLine(text, "\"ResourcePath\"=\"" + start + "\""));
+    EXPECT_TRUE(hasLine(text, "\"TorvellanSharedPath\"=\"" + start + "\""));
+    EXPECT_EQ(messageCount(), 0);
+}
+
+TEST_F(PathsDataPath, APathThatCannotBeReadIsReportedAndTheInitialDirectoryStays) {
+    writeRoot(machineFile(), "\"ResourcePath\"=dword:00000001\n\"TorvellanSharedPath\"=\"/var/data/\"\n");
+    std::string before = readFileText(machineFile());
+    ASSERT_EQ(loadDataPaths(), 1);
+    EXPECT_EQ(messageCount(), 1);
+    EXPECT_EQ(lastMessageText(), "Can't read registry");
+    EXPECT_EQ(uiCalls().back().kind, MESSAGE_ERROR);
+    EXPECT_EQ(paths.resourcePath, start);
+    EXPECT_EQ(paths.sharedBasePath, "/var/data/");
+    EXPECT_EQ(readFileText(machineFile()), before);
+}
+
+TEST_F(PathsDataPath, TheUsersSharedPathLeavesTheMachinesValueUnreadAndUnwritten) {
+    writeRoot(userFile(), "\"TorvellanSharedPath\"=\"/home/singer/shared/\"\n");
+    // Were the machine's value read, its wrong type would be reported; were it rewritten,
+    // the file would change.
+    writeRoot(machineFile(), "\"ResourcePath\"=\"/opt/melodrift/\"\n\"TorvellanSharedPath\"=dword:00000000\n");
+    std::string machineBefore = readFileText(machineFile());
+    std::string userBefore = readFileText(userFile());
+    ASSERT_EQ(loadDataPaths(), 1);
+    EXPECT_EQ(paths.sharedBasePath, "/home/singer/shared/");
+    EXPECT_EQ(paths.sharedFolder, "/home/singer/shared/Torvellan Shared/");
+    EXPECT_EQ(paths.resourcePath, "/opt/melodrift/");
+    EXPECT_EQ(messageCount(), 0);
+    EXPECT_EQ(readFileText(machineFile()), machineBefore);
+    EXPECT_EQ(readFileText(userFile()), userBefore);
+}
+
+TEST_F(PathsDataPath, AnEmptyUserValueCountsAsNone) {
+    writeRoot(userFile(), "\"TorvellanSharedPath\"=\"\"\n");
+    writeRoot(machineFile(), "\"ResourcePath\"=\"/opt/melodrift/\"\n\"TorvellanSharedPath\"=\"/var/data/\"\n");
+    ASSERT_EQ(loadDataPaths(), 1);
+    EXPECT_EQ(paths.sharedBasePath, "/var/data/");
+}
+
+TEST_F(PathsDataPath, AKeyThatCannotBeCreatedIsReportedAndStopsStartUp) {
+    writeFileText(folder.file("config"), "in the way");
+    EXPECT_EQ(loadDataPaths(), 0);
+    EXPECT_EQ(lastMessageText(), "Can't access registry properly");
+    EXPECT_EQ(messageCount(), 1);
+    EXPECT_EQ(quitFlag, 1u);
+    EXPECT_EQ(paths.resourcePath, start);
+    EXPECT_EQ(paths.sharedBasePath, start);
+}
+
+// ---- the user's shared folder ----
+
+using PathsSharedFolder = PathsTest;
+
+TEST_F(PathsSharedFolder, ASharedPathWithoutATrailingSlashIsStoredWithOne) {
+    ASSERT_EQ(saveSharedPath("/home/singer/takes"), 1);
+    std::string text = readFileText(userFile());
+    EXPECT_TRUE(hasLine(text, "\"TorvellanSharedPath\"=\"/home/singer/takes/\""));
+    EXPECT_FALSE(fs::exists(machineFile()));
+
+    ASSERT_EQ(saveSharedPath("/home/singer/other/"), 1);
+    EXPECT_TRUE(hasLine(readFileText(userFile()), "\"TorvellanSharedPath\"=\"/home/singer/other/\""));
+
+    resetRegistry();
+    ASSERT_EQ(loadDataPaths(), 1);
+    EXPECT_EQ(paths.sharedBasePath, "/home/singer/other/");
+    EXPECT_EQ(sharedFilePath("CS.fw"), "/home/singer/other/Torvellan Shared/CS.fw");
+}
+
+TEST_F(PathsSharedFolder, AnEmptySharedPathIsNotStored) {
+    ASSERT_EQ(saveSharedPath("/home/singer/takes/"), 1);
+    std::string before = readFileText(userFile());
+    EXPECT_EQ(saveSharedPath(""), 0);
+    EXPECT_EQ(readFileText(userFile()), before);
+}
+
+TEST_F(PathsSharedFolder, AFailedSaveIsReportedButDoesNotQuit) {
+    writeFileText(folder.file("config"), "in the way");
+    EXPECT_EQ(saveSharedPath("/home/singer/takes"), 0);
+    EXPECT_EQ(lastMessageText(), "Can't access registry properly");
+    EXPECT_EQ(quitFlag, 0u);
+}
+
+TEST_F(PathsSharedFolder, TheSharedFolderIsBelowTheBasePath) {
+    setSharedBasePath("/srv/music");
+    EXPECT_EQ(paths.sharedBasePath, "/srv/music/");
+    EXPECT_EQ(sharedFilePath("CSUndo/Undo3"), "/srv/music/Torvellan Shared/CSUndo/Undo3");
+}
+
+// ---- resources ----
+
+using PathsResources = PathsTest;
+
+TEST_F(PathsResources, TheConfiguredResourceFolderIsUsedWhenItHoldsResources) {
+    fs::create_directories(start + "Resources");
+    EXPECT_EQ(resourceFilePath("CSInst.dat"), start + "Resources/CSInst.dat");
+}
+
+TEST_F(PathsResources, WithoutResourcesInTheConfiguredFolderTheSourceTreesAreFound) {
+    // This file is tests/shell/pathsTest.cpp in the source tree the program was built from.
+    fs::path sourceRoot = fs::path(__FILE__).parent_path().parent_path().parent_path();
+    if (!fs::is_directory(sourceRoot / "Resources")) GTEST_SKIP() << "the source tree holds no Resources folder";
+    std::string found = resourceFilePath("CSInst.dat");
+    EXPECT_NE(found, start + "Resources/CSInst.dat");
+    EXPECT_TRUE(fs::equivalent(fs::path(found).parent_path(), sourceRoot / "Resources")) << found;
+}
