@@ -1,0 +1,277 @@
+// The note list and barline list: the Note record's bytes, the list limits, and the checks
+// that keep note and barline times inside the song and clear of their neighbours.
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <cstring>
+#include <limits>
+
+#include "notes/noteList.h"
+#include "notes/noteFixtures.h"
+
+// ---- the record ----
+
+TEST(NoteListLayout, EveryFieldSitsInItsSlotOfTheSeventyTwoByteRecord) {
+    Note note{};
+    note.pitch = 440.0f;
+    note.midiStart = 1.0f;
+    note.midiEnd = 2.0f;
+    note.waveStart = 3.0f;
+    note.waveEnd = 4.0f;
+    note.recognitionValues[0] = 5.0f;
+    note.recognitionValues[2] = 6.0f;
+    note.recognitionWeight = 100.0f;
+    note.midiNote = 69;
+    note.recognitionCode = 0x11223344;
+    note.recognitionExtra[1] = 0x55667788;
+    note.instrument = -1;
+    note.sourceIndex = 9;
+    note.group = 7;
+    note.volumeSum = 0x01020304;
+    note.recognitionTail = 0xA1B2C3D4;
+    unsigned char bytes[72];
+    ASSERT_EQ(sizeof(Note), sizeof(bytes));
+    std::memcpy(bytes, &note, sizeof(bytes));
+
+    auto f32At = [&](int offset) { float v; std::memcpy(&v, bytes + offset, 4); return v; };
+    auto u32At = [&](int offset) { uint32_t v; std::memcpy(&v, bytes + offset, 4); return v; };
+    EXPECT_EQ(f32At(0), 440.0f);
+    EXPECT_EQ(f32At(4), 1.0f);
+    EXPECT_EQ(f32At(8), 2.0f);
+    EXPECT_EQ(f32At(12), 3.0f);
+    EXPECT_EQ(f32At(16), 4.0f);
+    EXPECT_EQ(f32At(20), 5.0f);
+    EXPECT_EQ(f32At(28), 6.0f);
+    EXPECT_EQ(f32At(32), 100.0f);
+    EXPECT_EQ(bytes[36], 69);
+    EXPECT_EQ(bytes[37] | bytes[38] | bytes[39], 0) << "midiNote's slot is padded with zeros";
+    EXPECT_EQ(u32At(40), 0x11223344u);
+    EXPECT_EQ(u32At(48), 0x55667788u);
+    EXPECT_EQ(u32At(52), 0xFFFFFFFFu) << "instrument -1";
+    EXPECT_EQ(u32At(56), 9u);
+    EXPECT_EQ(bytes[60], 7);
+    EXPECT_EQ(bytes[61] | bytes[62] | bytes[63], 0) << "group's slot is padded with zeros";
+    EXPECT_EQ(u32At(64), 0x01020304u);
+    EXPECT_EQ(u32At(68), 0xA1B2C3D4u);
+}
+
+// ---- limits and order ----
+
+class NoteListLimits : public NoteSongTest {};
+
+TEST_F(NoteListLimits, TheListTakesSixteenThousandThreeHundredEightyFourNotesAndRefusesMore) {
+    for (int i = 0; i < MAX_CS_NOTES; i++) ASSERT_EQ(appendNote(noteSpanning(float(i), float(i) + 0.5f)), 1) << i;
+    EXPECT_EQ(noteList.count, 16384);
+    EXPECT_EQ(appendNote(noteSpanning(20000.0f, 20001.0f)), 0);
+    EXPECT_EQ(insertNote(0, noteSpanning(-5.0f, -4.0f)), 0);
+    EXPECT_EQ(noteList.count, 16384);
+    EXPECT_EQ(noteList.notes[0].waveStart, 0.0f) << "a refused insert moves nothing";
+    EXPECT_EQ(noteList.notes[16383].waveStart, 16383.0f);
+}
+
+TEST_F(NoteListLimits, TheBarlineListTakesTwoThousandFortyEightAndRefusesMore) {
+    for (int i = 0; i < MAX_CS_BARLINES; i++) ASSERT_EQ(appendBarline(float(i)), 1) << i;
+    EXPECT_EQ(barlineList.count, 2048);
+    EXPECT_EQ(appendBarline(5000.0f), 0);
+    EXPECT_EQ(insertBarline(3, 2.5f), 0);
+    EXPECT_EQ(barlineList.count, 2048);
+    EXPECT_EQ(barlineList.times[3], 3.0f);
+}
+
+TEST_F(NoteListLimits, InsertAndRemoveKeepTheOtherNotesInOrder) {
+    addNote(1.0f, 1.5f);
+    addNote(3.0f, 3.5f);
+    ASSERT_EQ(insertNote(1, noteSpanning(2.0f, 2.5f)), 1);
+    ASSERT_EQ(noteList.count, 3);
+    EXPECT_EQ(noteList.notes[0].waveStart, 1.0f);
+    EXPECT_EQ(noteList.notes[1].waveStart, 2.0f);
+    EXPECT_EQ(noteList.notes[2].waveStart, 3.0f);
+    ASSERT_EQ(removeNote(0), 1);
+    ASSERT_EQ(noteList.count, 2);
+    EXPECT_EQ(noteList.notes[0].waveStart, 2.0f);
+    EXPECT_EQ(noteList.notes[1].waveStart, 3.0f);
+}
+
+TEST_F(NoteListLimits, IndicesOutsideTheListsAreRefused) {
+    addNote(1.0f, 1.5f);
+    ASSERT_EQ(appendBarline(1.0f), 1);
+    EXPECT_EQ(insertNote(2, noteSpanning(2.0f, 2.5f)), 0);
+    EXPECT_EQ(insertNote(-1, noteSpanning(0.0f, 0.5f)), 0);
+    EXPECT_EQ(removeNote(1), 0);
+    EXPECT_EQ(removeNote(-1), 0);
+    EXPECT_EQ(insertBarline(2, 2.0f), 0);
+    EXPECT_EQ(removeBarline(1), 0);
+    EXPECT_EQ(removeBarline(-1), 0);
+    EXPECT_EQ(noteList.count, 1);
+    EXPECT_EQ(barlineList.count, 1);
+}
+
+TEST_F(NoteListLimits, ClosingTheSongEmptiesNotesAndBarlines) {
+    addNote(1.0f, 1.5f);
+    ASSERT_EQ(appendBarline(1.0f), 1);
+    resetNoteList();
+    EXPECT_EQ(noteList.count, 0);
+    EXPECT_EQ(barlineList.count, 0);
+}
+
+// ---- note times ----
+
+class NoteListTimes : public NoteSongTest {};
+
+TEST_F(NoteListTimes, AnEndReachingIntoTheNextNoteIsCutBackToItsStartOnABlockBoundary) {
+    // The next note starts three quarters of a block after 2.0 s; the nearest boundary is 2.0 + D.
+    const float nextStart = float(2.0 + 0.75 * D);
+    addNote(1.0f, 2.0f);
+    addNote(nextStart, 3.0f);
+    noteList.notes[0].waveEnd = float(nextStart + 0.2);
+    EXPECT_EQ(validateNoteTimes(0, false), 1);
+    EXPECT_DOUBLE_EQ(noteList.notes[0].waveEnd, 2.0 + D);
+    EXPECT_EQ(noteList.notes[0].waveStart, 1.0f);
+    EXPECT_EQ(noteList.notes[0].midiEnd, 2.0f) << "the MIDI span did not overlap and stays";
+}
+
+TEST_F(NoteListTimes, ANoteSqueezedBelowOneAndAHalfBlocksGetsTwoBlocksWithItsStartMovedBack) {
+    addNote(1.0f, 1.5f);
+    addNote(2.0f, 3.0f);
+    Note& note = noteList.notes[0];
+    note.waveStart = float(2.0 - D);   // one block before the next note
+    note.waveEnd = 2.2f;
+    EXPECT_EQ(validateNoteTimes(0, false), 1);
+    EXPECT_DOUBLE_EQ(note.waveEnd, 2.0);
+    EXPECT_DOUBLE_EQ(note.waveStart, 2.0 - 2 * D);
+}
+
+TEST_F(NoteListTimes, AStartInsideThePreviousNoteMovesToItsEndAndASqueezedNoteGrowsForward) {
+    addNote(1.0f, 2.0f);
+    addNote(3.0f, 4.0f);
+    Note& note = noteList.notes[1];
+    note.midiStart = 1.9f;                 // inside note 0's MIDI span
+    note.waveStart = 1.95f;                // inside note 0's wave span
+    note.waveEnd = float(2.0 + D);         // one block past note 0's end
+    EXPECT_EQ(validateNoteTimes(1, false), 1);
+    EXPECT_DOUBLE_EQ(note.midiStart, 2.0);
+    EXPECT_DOUBLE_EQ(note.midiEnd, 4.0) << "still long enough: its end stays";
+    EXPECT_DOUBLE_EQ(note.waveStart, 2.0);
+    EXPECT_DOUBLE_EQ(note.waveEnd, 2.0 + 2 * D);
+}
+
+TEST_F(NoteListTimes, ThirtySecondsIsTheLongestValidNote) {
+    makeSongOfBlocks(40 * 128);
+    addNote(1.0f, 31.0f);
+    EXPECT_EQ(validateNoteTimes(0, false), 1);
+    noteList.notes[0].waveEnd = 31.01f;
+    EXPECT_EQ(validateNoteTimes(0, false), 0);
+    noteList.notes[0].waveEnd = 31.0f;
+    noteList.notes[0].midiEnd = 31.01f;
+    EXPECT_EQ(validateNoteTimes(0, false), 0) << "the MIDI span counts as well";
+}
+
+TEST_F(NoteListTimes, OneAndAHalfBlocksIsTheShortestValidNote) {
+    addNote(1.0f, float(1.0 + 1.5 * D));
+    EXPECT_EQ(validateNoteTimes(0, false), 1);
+    noteList.notes[0].waveEnd = float(1.0 + 1.25 * D);
+    EXPECT_EQ(validateNoteTimes(0, false), 0);
+    EXPECT_DOUBLE_EQ(noteList.notes[0].waveEnd, 1.0 + 1.25 * D) << "a short note alone is refused, not lengthened";
+}
+
+TEST_F(NoteListTimes, NegativeTimesBecomeZero) {
+    addNote(-0.5f, 1.0f);
+    noteList.notes[0].waveStart = -0.25f;
+    EXPECT_EQ(validateNoteTimes(0, false), 1);
+    EXPECT_EQ(noteList.notes[0].midiStart, 0.0f);
+    EXPECT_EQ(noteList.notes[0].waveStart, 0.0f);
+}
+
+TEST_F(NoteListTimes, TimesBeyondTheSongComeBackToItsEndUnlessTheNoteStandsAlone) {
+    addNote(9.5f, 12.0f);
+    EXPECT_EQ(validateNoteTimes(0, false), 1);
+    EXPECT_EQ(noteList.notes[0].midiEnd, 10.0f);
+    EXPECT_EQ(noteList.notes[0].waveEnd, 10.0f);
+
+    noteList.notes[0] = noteSpanning(9.5f, 12.0f);
+    EXPECT_EQ(validateNoteTimes(0, true), 1);
+    EXPECT_EQ(noteList.notes[0].waveEnd, 12.0f);
+}
+
+TEST_F(NoteListTimes, ANoteStandingAloneIgnoresItsNeighbours) {
+    addNote(1.0f, 2.0f);
+    addNote(1.5f, 3.0f);
+    noteList.notes[1].waveStart = -1.0f;
+    EXPECT_EQ(validateNoteTimes(1, true), 1);
+    EXPECT_EQ(noteList.notes[1].midiStart, 1.5f);
+    EXPECT_EQ(noteList.notes[1].waveStart, 0.0f) << "negatives still become 0";
+}
+
+TEST_F(NoteListTimes, TimesThatAreNotNumbersCountAsNegative) {
+    addNote(1.0f, 2.0f);
+    noteList.notes[0].waveEnd = std::numeric_limits<float>::quiet_NaN();
+    EXPECT_EQ(validateNoteTimes(0, false), 0) << "the wave span now ends at 0, before it starts";
+    EXPECT_EQ(noteList.notes[0].waveEnd, 0.0f);
+    noteList.notes[0].waveStart = std::numeric_limits<float>::quiet_NaN();
+    noteList.notes[0].waveEnd = 1.0f;
+    EXPECT_EQ(validateNoteTimes(0, false), 1);
+    EXPECT_EQ(noteList.notes[0].waveStart, 0.0f);
+}
+
+TEST_F(NoteListTimes, AnIndexOutsideTheListIsRefused) {
+    addNote(1.0f, 2.0f);
+    EXPECT_EQ(validateNoteTimes(1, false), 0);
+    EXPECT_EQ(validateNoteTimes(-1, true), 0);
+}
+
+// ---- barline times ----
+
+class NoteListBarlines : public NoteSongTest {
+protected:
+    void addBarline(float time) { ASSERT_EQ(appendBarline(time), 1); }
+};
+
+TEST_F(NoteListBarlines, NegativeTimesBecomeZeroAndTimesPastTheEndTheEnd) {
+    addBarline(-0.5f);
+    addBarline(12.0f);
+    validateBarlineTime(0);
+    validateBarlineTime(1);
+    EXPECT_EQ(barlineList.times[0], 0.0f);
+    EXPECT_EQ(barlineList.times[1], 10.0f);
+}
+
+TEST_F(NoteListBarlines, ABarlineKeepsTwoBlocksFromThePreviousOne) {
+    addBarline(1.0f);
+    addBarline(1.01f);
+    validateBarlineTime(1);
+    EXPECT_DOUBLE_EQ(barlineList.times[1], 1.0 + 2 * D);
+}
+
+TEST_F(NoteListBarlines, ABarlineKeepsTwoBlocksFromTheNextOne) {
+    addBarline(1.0f);
+    addBarline(2.0f);
+    barlineList.times[0] = 1.995f;
+    validateBarlineTime(0);
+    EXPECT_DOUBLE_EQ(barlineList.times[0], 2.0 - 2 * D);
+}
+
+TEST_F(NoteListBarlines, AMovedBarlineLandsOnTheNearestBlockBoundary) {
+    // Two blocks after a barline three quarters of a block past 1.0 s is 1.0 + 2.75 D; the
+    // nearest boundary is 1.0 + 3 D.
+    addBarline(float(1.0 + 0.75 * D));
+    addBarline(1.0f);
+    validateBarlineTime(1);
+    EXPECT_DOUBLE_EQ(barlineList.times[1], 1.0 + 3 * D);
+}
+
+TEST_F(NoteListBarlines, ABarlineFarFromItsNeighboursStaysWhereItIs) {
+    addBarline(1.0f);
+    addBarline(float(1.0 + 2 * D));
+    addBarline(3.0f);
+    barlineList.times[1] = float(1.0 + 2.3 * D);
+    validateBarlineTime(1);
+    EXPECT_EQ(barlineList.times[1], float(1.0 + 2.3 * D)) << "not snapped when not moved";
+}
+
+TEST_F(NoteListBarlines, AnIndexOutsideTheListChangesNothing) {
+    addBarline(-1.0f);
+    validateBarlineTime(1);
+    validateBarlineTime(-1);
+    EXPECT_EQ(barlineList.times[0], -1.0f);
+    EXPECT_EQ(barlineList.count, 1);
+}
