@@ -1,0 +1,83 @@
+// The song record and its time axis. Block durations start at the nominal duration and are
+// changed per block by timing edits, so the time of a block is always a sum of durations.
+#include "store/song.h"
+
+#include <cmath>
+#include <new>
+#include <stdexcept>
+
+Song song;
+
+// Growth step when the nominal duration is not known yet: 300 s of the shortest blocks.
+static const uint32_t FALLBACK_GROWTH_BLOCKS = 300 * 128;
+
+void resetSong() {
+    song.blockCount = 0;
+    song.sampleBlockDuration = 0.0;
+    std::vector<double>().swap(song.sampleBlockDurations);
+    song.waveFormat = SongWaveFormat{};
+    song.workingWaveBytes = 0;
+}
+
+int growSampleBlockDurations(uint32_t blocks) {
+    size_t length = song.sampleBlockDurations.size();
+    if (blocks <= length) return 1;
+    uint32_t step = FALLBACK_GROWTH_BLOCKS;
+    if (song.sampleBlockDuration > 0.0) step = uint32_t(300.0 / song.sampleBlockDuration);
+    if (step == 0) step = 1;
+    size_t steps = (blocks - length + step - 1) / step;
+    try {
+        song.sampleBlockDurations.resize(length + steps * step, 0.0);
+    } catch (const std::bad_alloc&) {
+        return 0;
+    } catch (const std::length_error&) {
+        return 0;
+    }
+    return 1;
+}
+
+double songTimeOfBlock(uint32_t n, uint32_t from) {
+    const std::vector<double>& durations = song.sampleBlockDurations;
+    size_t end = std::min<size_t>(n, durations.size());
+    double sum = 0.0;
+    for (size_t k = from; k < end; k++) sum += durations[k];
+    return sum;
+}
+
+double blockDuration(uint32_t n) {
+    return n < song.sampleBlockDurations.size() ? song.sampleBlockDurations[n] : 0.0;
+}
+
+uint32_t blockAtTime(double t, uint32_t startBlock, double startTime, double offset) {
+    double rest = t - offset - startTime;
+    uint32_t count = song.blockCount;
+    for (uint32_t k = startBlock; k < count; k++) {
+        double duration = blockDuration(k);
+        rest -= duration;
+        if (rest < 0.0) {
+            double toEnd = -rest;
+            // Half-way between two boundaries goes to the later one.
+            return toEnd > duration / 2 ? k : k + 1;
+        }
+    }
+    return count;
+}
+
+double snapTimeToBlock(double t, uint32_t startBlock, double startTime) {
+    uint32_t count = song.blockCount;
+    double end = startTime + songTimeOfBlock(count, startBlock);
+    if (t < end || count == 0) {
+        uint32_t k = blockAtTime(t, startBlock, startTime);
+        return startTime + songTimeOfBlock(k, startBlock);
+    }
+    // Past the last block the grid goes on at the last block's duration.
+    double duration = blockDuration(count - 1);
+    if (duration <= 0.0) return end;
+    double extra = t - end;
+    double whole = std::floor(extra / duration);
+    double toEnd = duration - (extra - whole * duration);
+    double blocks = toEnd > duration / 2 ? whole : whole + 1;
+    return end + blocks * duration;
+}
+
+double songDuration() { return songTimeOfBlock(song.blockCount); }

@@ -1,0 +1,38 @@
+// Removal of the song's working files, at start-up (what an earlier run left) and when the
+// song closes.
+#include "store/workingFiles.h"
+
+#include <mutex>
+
+#include "notes/noteList.h"
+#include "notes/selection.h"
+#include "platform/sync.h"
+#include "shell/paths.h"
+#include "store/fileRoutines.h"
+#include "store/song.h"
+#include "store/undo.h"
+
+const char* const WORKING_FILE_NAMES[11] = {"CS.fw",  "CS.fp",  "CS.ft",   "CS.fi",   "CS.ft+", "CS.fi+",
+                                            "_CS.fw", "_CS.ft", "_CS.fi", "_CS.ft+", "_CS.fi+"};
+
+int deleteWorkingFiles() {
+    int deleted = 1;
+    for (const char* name : WORKING_FILE_NAMES)
+        if (!deleteReportedFile(sharedFilePath(name))) deleted = 0;
+    return deleted;
+}
+
+int closeSong() {
+    waitForUndoSnapshotWriter();
+    int closed = 1;
+    {
+        std::lock_guard<std::mutex> guard(CSAccessWaveFileMutex);
+        if (!deleteReportedFile(sharedFilePath("CS.fw"))) closed = 0;
+    }
+    resetSong();
+    resetNoteList();
+    if (!emptyUndoFolder()) closed = 0;
+    if (!deleteWorkingFiles()) closed = 0;
+    resetSelection();
+    return closed;
+}

@@ -1,0 +1,14 @@
+#pragma once
+// The song's working files in the shared folder: their names, their removal at start-up and
+// when the song closes.
+
+// Working files removed by deleteWorkingFiles, in this order.
+extern const char* const WORKING_FILE_NAMES[11];
+
+// Deletes each working file that exists; 1 when all are gone, 0 when one could not be
+// deleted (reported by "File could not be deleted").
+int deleteWorkingFiles();
+// Closes the song: waits for the undo snapshot writer, deletes CS.fw holding
+// CSAccessWaveFileMutex, frees the time axis, empties the undo folder and deletes the
+// remaining working files. 1 when everything was removed.
+int closeSong();
