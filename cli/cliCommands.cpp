@@ -1,0 +1,15 @@
+// The table of the command-line tool's commands.
+#include "cli/cliCommands.h"
+
+const std::vector<CliCommand>& cliCommands() {
+    static const std::vector<CliCommand> commands = {
+        {"info", "FILE", "print the format, size and duration of a wave file", 1, runInfoCommand},
+    };
+    return commands;
+}
+
+const CliCommand* findCliCommand(const std::string& name) {
+    for (const CliCommand& command : cliCommands())
+        if (name == command.name) return &command;
+    return nullptr;
+}
