@@ -1,0 +1,23 @@
+// The string table, kept as one list of numbered texts.
+#include "resources/strings.h"
+
+struct ResourceStringEntry {
+    int id;              // string number
+    const char* text;    // the text, exactly as the user reads it
+};
+
+static const ResourceStringEntry resourceStrings[] = {
+    {10230, "File could not be closed"},
+    {10231, "File could not be seeked"},
+    {10232, "Bytes were not stored properly"},
+    {10271, "Made with Torvellan Melodrift - www.torvellan.example"},
+    {10325, "Message from Torvellan Melodrift"},
+    {10401, "Sorry - there is insufficient memory available to continue. Please try freeing up some memory "
+            "from other applications."},
+};
+
+std::string resourceString(int id) {
+    for (const ResourceStringEntry& entry : resourceStrings)
+        if (entry.id == id) return entry.text;
+    return "";
+}
