@@ -9,6 +9,8 @@
 #include "platform/sync.h"
 #include "shell/paths.h"
 #include "store/fileRoutines.h"
+#include "store/ftBlockStore.h"
+#include "store/hiresFTBlockStore.h"
 #include "store/song.h"
 #include "store/undo.h"
 
@@ -22,6 +24,22 @@ int deleteWorkingFiles() {
     return deleted;
 }
 
+int closeFTStore() {
+    song.blockCount = 0;
+    freeFTBlockWindow();
+    int deleted = 1;
+    // Files still open belong to a job that is running; it closes them itself.
+    if (!ftFilesOpen()) {
+        for (const char* name : {"CS.ft", "CS.fi"})
+            if (!deleteReportedFile(sharedFilePath(name))) deleted = 0;
+    }
+    if (!hiresFilesOpen()) {
+        for (const char* name : {"CS.ft+", "CS.fi+"})
+            if (!deleteReportedFile(sharedFilePath(name))) deleted = 0;
+    }
+    return deleted;
+}
+
 int closeSong() {
     waitForUndoSnapshotWriter();
     int closed = 1;
@@ -29,6 +47,8 @@ int closeSong() {
         std::lock_guard<std::mutex> guard(CSAccessWaveFileMutex);
         if (!deleteReportedFile(sharedFilePath("CS.fw"))) closed = 0;
     }
+    if (!closeFTStore()) closed = 0;
+    freeHiresBuffers();
     resetSong();
     resetNoteList();
     if (!emptyUndoFolder()) closed = 0;

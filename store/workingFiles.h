@@ -8,6 +8,9 @@ extern const char* const WORKING_FILE_NAMES[11];
 // Deletes each working file that exists; 1 when all are gone, 0 when one could not be
 // deleted (reported by "File could not be deleted").
 int deleteWorkingFiles();
+// Empties the FT store: no blocks, an empty window with its arrays freed, and CS.ft/CS.fi
+// (CS.ft+/CS.fi+) deleted unless they are open. 1 when nothing failed to be deleted.
+int closeFTStore();
 // Closes the song: waits for the undo snapshot writer, deletes CS.fw holding
 // CSAccessWaveFileMutex, frees the time axis, empties the undo folder and deletes the
 // remaining working files. 1 when everything was removed.

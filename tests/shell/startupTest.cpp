@@ -20,6 +20,7 @@ protected:
     void SetUp() override {
         const char* config = std::getenv("MELODRIFT_CONFIG_DIR");
         savedConfig = config ? config : "";
+        savedPaths = paths;   // start-up resolves the paths anew; later suites need the run's
         setenv("MELODRIFT_CONFIG_DIR", folder.file("config").c_str(), 1);
         resetRegistry();
         options.sharedBasePath = folder.path();
@@ -31,6 +32,7 @@ protected:
         setFreeDiskSpaceOverride(NO_FREE_SPACE_OVERRIDE);
         setenv("MELODRIFT_CONFIG_DIR", savedConfig.c_str(), 1);
         resetRegistry();
+        paths = savedPaths;
         clearUiCalls();
     }
     std::string shared(const std::string& name) const { return folder.path() + "Torvellan Shared/" + name; }
@@ -38,6 +40,7 @@ protected:
     TempFolder folder;
     StartupOptions options{};
     std::string savedConfig;
+    Paths savedPaths;
 };
 
 TEST_F(StartUp, RemovesWhatAnEarlierRunLeftInTheSharedFolder) {
