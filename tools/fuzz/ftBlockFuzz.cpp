@@ -173,10 +173,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
 }
 
 #ifdef FT_BLOCK_FUZZ_REPLAY
-// The replay driver: seeds built here, then deterministic mutations of them, through the same
-// target, without libFuzzer. ftBlockFuzzReplay [runs] | --write-seeds DIR | FILE...
-#include <fstream>
-#include <iterator>
+// The seeds for the shared replay driver: ftBlockFuzzReplay [runs] | --write-seeds DIR | FILE...
+#include "fuzzReplay.h"
 
 using Bytes = std::vector<uint8_t>;
 
@@ -224,85 +222,5 @@ static std::vector<Bytes> seeds() {
     return all;
 }
 
-// xorshift64*: the same mutations on every machine and every run.
-struct Random {
-    uint64_t state;   // never 0
-    uint64_t next() {
-        state ^= state >> 12;
-        state ^= state << 25;
-        state ^= state >> 27;
-        return state * 2685821657736338717ULL;
-    }
-    size_t below(size_t n) { return n ? size_t(next() % n) : 0; }
-};
-
-static Bytes mutate(const Bytes& from, Random& random) {
-    static const uint32_t interesting[] = {0, 1, 2, 12, 15, 16, 255, 256, 0x7FFFFFFF, 0x80000000, 0xFFFFFFF0, 0xFFFFFFFF};
-    Bytes b = from;
-    int steps = 1 + int(random.below(4));
-    for (int s = 0; s < steps; s++) {
-        switch (random.below(5)) {
-        case 0:
-            if (!b.empty()) b[random.below(b.size())] ^= uint8_t(1 << random.below(8));
-            break;
-        case 1:
-            if (!b.empty()) b[random.below(b.size())] = uint8_t(random.next());
-            break;
-        case 2:
-            if (b.size() >= 4) {
-                size_t at = random.below(b.size() - 3);
-                uint32_t v = interesting[random.below(sizeof interesting / sizeof interesting[0])];
-                for (int i = 0; i < 4; i++) b[at + i] = uint8_t(v >> (8 * i));
-            }
-            break;
-        case 3:
-            b.resize(random.below(b.size() + 1));
-            break;
-        default:
-            if (!b.empty()) {
-                size_t from = random.below(b.size());
-                size_t count = 1 + random.below(std::min<size_t>(16, b.size() - from));
-                b.erase(b.begin() + long(from), b.begin() + long(from + count));
-            }
-            break;
-        }
-    }
-    return b;
-}
-
-int main(int argc, char** argv) {
-    if (argc == 3 && std::strcmp(argv[1], "--write-seeds") == 0) {
-        std::vector<Bytes> all = seeds();
-        for (size_t i = 0; i < all.size(); i++) {
-            std::ofstream out(std::string(argv[2]) + "/seed-" + std::to_string(i), std::ios::binary);
-            out.write(reinterpret_cast<const char*>(all[i].data()), std::streamsize(all[i].size()));
-        }
-        std::printf("%zu seeds written to %s\n", all.size(), argv[2]);
-        return 0;
-    }
-    if (argc >= 2 && !(argv[1][0] >= '0' && argv[1][0] <= '9')) {
-        for (int i = 1; i < argc; i++) {
-            std::ifstream in(argv[i], std::ios::binary);
-            Bytes b((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
-            LLVMFuzzerTestOneInput(b.data(), b.size());
-        }
-        std::printf("%d files replayed\n", argc - 1);
-        return 0;
-    }
-    long runs = argc >= 2 ? std::strtol(argv[1], nullptr, 10) : 20000;
-    std::vector<Bytes> all = seeds();
-    Random random{0x9E3779B97F4A7C15ULL};
-    long done = 0;
-    for (const Bytes& s : all) {
-        LLVMFuzzerTestOneInput(s.data(), s.size());
-        done++;
-    }
-    for (; done < runs; done++) {
-        Bytes input = mutate(all[random.below(all.size())], random);
-        if (random.below(4) == 0) input = mutate(input, random);
-        LLVMFuzzerTestOneInput(input.data(), input.size());
-    }
-    std::printf("%ld inputs replayed\n", done);
-    return 0;
-}
+int main(int argc, char** argv) { return runFuzzReplay(argc, argv, seeds(), LLVMFuzzerTestOneInput, 20000); }
 #endif

@@ -221,15 +221,10 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* input, size_t size) {
 }
 
 #ifdef HIRES_BLOCK_FUZZ_REPLAY
-// The replay driver: over seeds built here and deterministic mutations of them (the test
-// run uses this), over given files (reproducing a finding), or writing the seeds into a
-// folder as the libFuzzer corpus.
-//   hiresBlockFuzzReplay [runs]               seeds, then mutations, runs in all (20000)
-//   hiresBlockFuzzReplay --write-seeds DIR    one file per seed
-//   hiresBlockFuzzReplay FILE...              each file once
+// The seeds for the shared replay driver: hiresBlockFuzzReplay [runs] | --write-seeds DIR | FILE...
 #include <cstring>
-#include <fstream>
-#include <iterator>
+
+#include "fuzzReplay.h"
 
 static void put16(Bytes& b, uint32_t v) {
     b.push_back(uint8_t(v));
@@ -288,104 +283,5 @@ static std::vector<Bytes> seeds() {
     return all;
 }
 
-// xorshift64*: the same mutations on every machine and every run.
-struct Random {
-    uint64_t state;
-    uint64_t next() {
-        state ^= state >> 12;
-        state ^= state << 25;
-        state ^= state >> 27;
-        return state * 2685821657736338717ULL;
-    }
-    size_t below(size_t n) { return n ? size_t(next() % n) : 0; }
-};
-
-static Bytes mutate(const Bytes& seed, Random& random) {
-    static const uint32_t interesting[] = {0, 1, 2, 3, 9, 10, 13, 0x7F, 0x80, 0xFF, 0x100, 0xFFFF, 0x7F800000,
-                                           0x7FC00000, 0xFF800000, 0x80000000, 0x7F7FFFFF, 0xFFFFFFFF};
-    Bytes b = seed;
-    int steps = 1 + int(random.below(4));
-    for (int s = 0; s < steps; s++) {
-        switch (random.below(6)) {
-        case 0:
-            if (!b.empty()) b[random.below(b.size())] ^= uint8_t(1 << random.below(8));
-            break;
-        case 1:
-            if (!b.empty()) b[random.below(b.size())] = uint8_t(random.next());
-            break;
-        case 2:
-            if (b.size() >= 4) {
-                size_t at = random.below(b.size() - 3);
-                uint32_t v = interesting[random.below(sizeof interesting / sizeof interesting[0])];
-                for (int i = 0; i < 4; i++) b[at + i] = uint8_t(v >> (8 * i));
-            }
-            break;
-        case 3:
-            b.resize(random.below(b.size() + 1));
-            break;
-        case 4: {
-            size_t at = random.below(b.size() + 1);
-            Bytes extra(1 + random.below(16));
-            for (uint8_t& x : extra) x = uint8_t(random.next());
-            b.insert(b.begin() + long(at), extra.begin(), extra.end());
-            break;
-        }
-        default:
-            if (!b.empty()) {
-                size_t from = random.below(b.size());
-                size_t count = 1 + random.below(std::min<size_t>(16, b.size() - from));
-                b.erase(b.begin() + long(from), b.begin() + long(from + count));
-            }
-            break;
-        }
-    }
-    return b;
-}
-
-static int writeSeeds(const std::string& to) {
-    std::vector<Bytes> all = seeds();
-    for (size_t i = 0; i < all.size(); i++) {
-        std::string path = to + "/seed-" + std::to_string(i);
-        std::ofstream out(path, std::ios::binary | std::ios::trunc);
-        out.write(reinterpret_cast<const char*>(all[i].data()), std::streamsize(all[i].size()));
-        if (!out) {
-            std::fprintf(stderr, "cannot write %s\n", path.c_str());
-            return 1;
-        }
-    }
-    std::printf("%zu seeds written to %s\n", all.size(), to.c_str());
-    return 0;
-}
-
-int main(int argc, char** argv) {
-    if (argc == 3 && std::strcmp(argv[1], "--write-seeds") == 0) return writeSeeds(argv[2]);
-    if (argc >= 2 && !(argv[1][0] >= '0' && argv[1][0] <= '9')) {
-        for (int i = 1; i < argc; i++) {
-            std::ifstream in(argv[i], std::ios::binary);
-            if (!in) {
-                std::fprintf(stderr, "cannot read %s\n", argv[i]);
-                return 1;
-            }
-            Bytes b((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
-            LLVMFuzzerTestOneInput(b.data(), b.size());
-        }
-        std::printf("%d files replayed\n", argc - 1);
-        return 0;
-    }
-    long runs = argc >= 2 ? std::strtol(argv[1], nullptr, 10) : 20000;
-    std::vector<Bytes> all = seeds();
-    Random random{0x2545F4914F6CDD1DULL};
-    long done = 0;
-    for (const Bytes& seed : all) {
-        LLVMFuzzerTestOneInput(seed.data(), seed.size());
-        done++;
-    }
-    for (; done < runs; done++) {
-        Bytes in = mutate(all[random.below(all.size())], random);
-        if (random.below(4) == 0) in = mutate(in, random);
-        LLVMFuzzerTestOneInput(in.data(), in.size());
-    }
-    std::printf("%ld inputs replayed\n", done);
-    return 0;
-}
+int main(int argc, char** argv) { return runFuzzReplay(argc, argv, seeds(), LLVMFuzzerTestOneInput, 20000); }
 #endif

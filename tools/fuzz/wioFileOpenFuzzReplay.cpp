@@ -1,9 +1,5 @@
-// Replays the wave reader's fuzz target without libFuzzer: over seed files built here and
-// deterministic mutations of them (the test run uses this), over given files (reproducing
-// a finding), or writes the seeds into a folder as the libFuzzer corpus.
-//   wioFileOpenFuzzReplay [runs]               seeds, then mutations, runs in all (20000)
-//   wioFileOpenFuzzReplay --write-seeds DIR    one file per seed
-//   wioFileOpenFuzzReplay FILE...              each file once
+// The seeds of the wave reader's fuzz target, for the shared replay driver (fuzzReplay.h):
+// wioFileOpenFuzzReplay [runs] | --write-seeds DIR | FILE...
 #include <algorithm>
 #include <cstdint>
 #include <cstdio>
@@ -16,7 +12,9 @@
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size);
 
-using Bytes = std::vector<uint8_t>;
+#include "fuzzReplay.h"
+
+using Bytes = FuzzBytes;
 
 static void put16(Bytes& b, uint16_t v) {
     b.push_back(uint8_t(v));
@@ -143,113 +141,6 @@ static std::vector<Bytes> seeds() {
     return all;
 }
 
-// xorshift64*: the same mutations on every machine and every run.
-struct Random {
-    uint64_t state;   // never 0
-    uint64_t next() {
-        state ^= state >> 12;
-        state ^= state << 25;
-        state ^= state >> 27;
-        return state * 2685821657736338717ULL;
-    }
-    size_t below(size_t n) { return n ? size_t(next() % n) : 0; }
-};
-
-static Bytes mutate(const Bytes& seed, Random& random) {
-    static const uint32_t interesting[] = {0, 1, 2, 3, 4, 8, 16, 17, 18, 0x7F, 0x80, 0xFF, 0xFFFF, 0x10000, 0x10001,
-                                           0x7FFFFFFF, 0x80000000, 0xFFFFFFF0, 0xFFFFFFFE, 0xFFFFFFFF};
-    Bytes b = seed;
-    int steps = 1 + int(random.below(4));
-    for (int s = 0; s < steps; s++) {
-        switch (random.below(7)) {
-        case 0:
-            if (!b.empty()) b[random.below(b.size())] ^= uint8_t(1 << random.below(8));
-            break;
-        case 1:
-            if (!b.empty()) b[random.below(b.size())] = uint8_t(random.next());
-            break;
-        case 2:
-            if (b.size() >= 4) {
-                size_t at = random.below(b.size() - 3);
-                if (random.below(2)) at &= ~size_t(3);   // fields mostly sit on 4-byte boundaries
-                uint32_t v = interesting[random.below(sizeof interesting / sizeof interesting[0])];
-                for (int i = 0; i < 4; i++) b[at + i] = uint8_t(v >> (8 * i));
-            }
-            break;
-        case 3:
-            b.resize(random.below(b.size() + 1));
-            break;
-        case 4: {
-            size_t at = random.below(b.size() + 1);
-            Bytes extra(1 + random.below(16));
-            for (uint8_t& x : extra) x = uint8_t(random.next());
-            b.insert(b.begin() + long(at), extra.begin(), extra.end());
-            break;
-        }
-        case 5:
-            if (!b.empty()) {
-                size_t from = random.below(b.size());
-                size_t count = 1 + random.below(std::min<size_t>(32, b.size() - from));
-                Bytes slice(b.begin() + long(from), b.begin() + long(from + count));
-                b.insert(b.begin() + long(random.below(b.size() + 1)), slice.begin(), slice.end());
-            }
-            break;
-        default:
-            if (!b.empty()) {
-                size_t from = random.below(b.size());
-                size_t count = 1 + random.below(std::min<size_t>(16, b.size() - from));
-                b.erase(b.begin() + long(from), b.begin() + long(from + count));
-            }
-            break;
-        }
-    }
-    return b;
-}
-
-static int writeSeeds(const std::string& folder) {
-    std::vector<Bytes> all = seeds();
-    for (size_t i = 0; i < all.size(); i++) {
-        std::string path = folder + "/seed-" + std::to_string(i) + ".wav";
-        std::ofstream out(path, std::ios::binary | std::ios::trunc);
-        out.write(reinterpret_cast<const char*>(all[i].data()), std::streamsize(all[i].size()));
-        if (!out) {
-            std::fprintf(stderr, "cannot write %s\n", path.c_str());
-            return 1;
-        }
-    }
-    std::printf("%zu seeds written to %s\n", all.size(), folder.c_str());
-    return 0;
-}
-
 int main(int argc, char** argv) {
-    if (argc == 3 && std::strcmp(argv[1], "--write-seeds") == 0) return writeSeeds(argv[2]);
-    if (argc >= 2 && !(argv[1][0] >= '0' && argv[1][0] <= '9')) {
-        for (int i = 1; i < argc; i++) {
-            std::ifstream in(argv[i], std::ios::binary);
-            if (!in) {
-                std::fprintf(stderr, "cannot read %s\n", argv[i]);
-                return 1;
-            }
-            Bytes b((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
-            LLVMFuzzerTestOneInput(b.data(), b.size());
-        }
-        std::printf("%d files replayed\n", argc - 1);
-        return 0;
-    }
-    long runs = argc >= 2 ? std::strtol(argv[1], nullptr, 10) : 20000;
-    std::vector<Bytes> all = seeds();
-    Random random{0x9E3779B97F4A7C15ULL};
-    long done = 0;
-    for (const Bytes& seed : all) {
-        LLVMFuzzerTestOneInput(seed.data(), seed.size());
-        done++;
-    }
-    for (; done < runs; done++) {
-        Bytes input = mutate(all[random.below(all.size())], random);
-        // Mutations of mutations reach further from the seeds.
-        if (random.below(4) == 0) input = mutate(input, random);
-        LLVMFuzzerTestOneInput(input.data(), input.size());
-    }
-    std::printf("%ld inputs replayed\n", done);
-    return 0;
+    return runFuzzReplay(argc, argv, seeds(), LLVMFuzzerTestOneInput, 20000, ".wav");
 }
