@@ -1,0 +1,249 @@
+// The Standard MIDI File primitives: variable-length quantities, the exact bytes of chunks and
+// events, lengths filled in at the end, Latin-1 text, and the failures of the file routines.
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "platform/files.h"
+#include "platform/ui.h"
+#include "playback/midiFile.h"
+#include "playback/midiTestReader.h"
+#include "support/testSupport.h"
+
+using Bytes = std::vector<uint8_t>;
+
+static Bytes encoded(uint32_t value) {
+    uint8_t out[4];
+    int count = encodeVariableLength(value, out);
+    return Bytes(out, out + count);
+}
+
+TEST(MidiFileVariableLength, KnownValuesEncodeAsTheFileFormatGivesThem) {
+    EXPECT_EQ(encoded(0), (Bytes{0x00}));
+    EXPECT_EQ(encoded(0x40), (Bytes{0x40}));
+    EXPECT_EQ(encoded(0x7F), (Bytes{0x7F}));
+    EXPECT_EQ(encoded(0x80), (Bytes{0x81, 0x00}));
+    EXPECT_EQ(encoded(512), (Bytes{0x84, 0x00}));
+    EXPECT_EQ(encoded(0x2000), (Bytes{0xC0, 0x00}));
+    EXPECT_EQ(encoded(0x3FFF), (Bytes{0xFF, 0x7F}));
+    EXPECT_EQ(encoded(0x4000), (Bytes{0x81, 0x80, 0x00}));
+    EXPECT_EQ(encoded(0x1FFFFF), (Bytes{0xFF, 0xFF, 0x7F}));
+    EXPECT_EQ(encoded(0x200000), (Bytes{0x81, 0x80, 0x80, 0x00}));
+    EXPECT_EQ(encoded(0x08000000), (Bytes{0xC0, 0x80, 0x80, 0x00}));
+    EXPECT_EQ(encoded(0x0FFFFFFF), (Bytes{0xFF, 0xFF, 0xFF, 0x7F}));
+}
+
+TEST(MidiFileVariableLength, ValuesBeyondFourBytesAreWrittenAsTheLargestThatFits) {
+    EXPECT_EQ(encoded(0x10000000), (Bytes{0xFF, 0xFF, 0xFF, 0x7F}));
+    EXPECT_EQ(encoded(0xFFFFFFFF), (Bytes{0xFF, 0xFF, 0xFF, 0x7F}));
+}
+
+class MidiFileTest : public ::testing::Test {
+protected:
+    void SetUp() override {
+        clearUiCalls();
+        clearFileFailures();
+    }
+    void TearDown() override { clearFileFailures(); }
+    // Header of a format-1 file with tracks tracks at 256 ticks per quarter.
+    static Bytes header(uint8_t tracks) {
+        return Bytes{'M', 'T', 'h', 'd', 0, 0, 0, 6, 0, 1, 0, tracks, 0x01, 0x00};
+    }
+    static void append(Bytes& to, const Bytes& more) { to.insert(to.end(), more.begin(), more.end()); }
+    static Bytes track(const Bytes& body) {
+        uint32_t n = uint32_t(body.size());
+        Bytes b{'M', 'T', 'r', 'k', uint8_t(n >> 24), uint8_t(n >> 16), uint8_t(n >> 8), uint8_t(n)};
+        append(b, body);
+        return b;
+    }
+    TempFolder folder;
+    std::string path = folder.file("out.mid");
+};
+
+using MidiFileChunks = MidiFileTest;
+
+TEST_F(MidiFileChunks, AOneTrackFileHasExactlyTheseBytes) {
+    MidiFileWriter w;
+    ASSERT_EQ(createMidiFile(w, path), 1);
+    writeMidiHeader(w, 1, 1, 256);
+    beginMidiTrack(w);
+    writeMidiTempo(w, 0, 500000);
+    writeMidiNoteOn(w, 0, 0, 60, 100);
+    writeMidiPitchBend(w, 0, 0, 8192);
+    writeMidiNoteOff(w, 512, 0, 60);
+    endMidiTrack(w, 1);
+    ASSERT_EQ(finishMidiFile(w), 1);
+
+    Bytes expected = header(1);
+    append(expected, track({0x00, 0xFF, 0x51, 0x03, 0x07, 0xA1, 0x20,   // tempo 500000
+                            0x00, 0x90, 0x3C, 0x64,                     // note on, key 60, velocity 100
+                            0x00, 0xE0, 0x00, 0x40,                     // no bend
+                            0x84, 0x00, 0x80, 0x3C, 0x00,               // 512 ticks later, note off
+                            0x01, 0xFF, 0x2F, 0x00}));                  // end of track a tick later
+    EXPECT_EQ(readFileBytes(path), expected);
+    EXPECT_EQ(messageCount(), 0);
+}
+
+TEST_F(MidiFileChunks, EveryTrackGetsItsOwnLengthAndItsDeltasStartAtZero) {
+    MidiFileWriter w;
+    ASSERT_EQ(createMidiFile(w, path), 1);
+    writeMidiHeader(w, 1, 2, 256);
+    beginMidiTrack(w);
+    writeMidiTextEvent(w, 0, MIDI_META_TRACK_NAME, "Tempo");
+    writeMidiControlChange(w, 300, 2, MIDI_CC_PAN, 61);
+    endMidiTrack(w, 0);
+    beginMidiTrack(w);
+    writeMidiProgramChange(w, 5, 3, 53);
+    writeMidiKeySignature(w, 5, 0, 0);
+    endMidiTrack(w, 1);
+    ASSERT_EQ(finishMidiFile(w), 1);
+
+    Bytes expected = header(2);
+    append(expected, track({0x00, 0xFF, 0x03, 0x05, 'T', 'e', 'm', 'p', 'o',
+                            0x82, 0x2C, 0xB2, 0x0A, 0x3D,   // 300 ticks, pan on channel 2
+                            0x00, 0xFF, 0x2F, 0x00}));
+    append(expected, track({0x05, 0xC3, 0x35,                 // 5 ticks from this track's start
+                            0x00, 0xFF, 0x59, 0x02, 0x00, 0x00,
+                            0x01, 0xFF, 0x2F, 0x00}));
+    EXPECT_EQ(readFileBytes(path), expected);
+}
+
+TEST_F(MidiFileChunks, AnEventBeforeTheLastOneFollowsItWithDeltaZero) {
+    MidiFileWriter w;
+    ASSERT_EQ(createMidiFile(w, path), 1);
+    writeMidiHeader(w, 1, 1, 256);
+    beginMidiTrack(w);
+    writeMidiNoteOn(w, 100, 0, 60, 90);
+    writeMidiNoteOff(w, 99, 0, 60);
+    writeMidiNoteOn(w, 101, 0, 62, 90);
+    endMidiTrack(w, 0);
+    ASSERT_EQ(finishMidiFile(w), 1);
+
+    ReadMidiFile file = readMidiBytes(readFileBytes(path));
+    ASSERT_EQ(file.error, "");
+    ASSERT_EQ(file.tracks[0].events.size(), 3u);
+    EXPECT_EQ(file.tracks[0].events[0].tick, 100u);
+    EXPECT_EQ(file.tracks[0].events[1].tick, 100u);
+    EXPECT_EQ(file.tracks[0].events[2].tick, 101u);
+}
+
+TEST_F(MidiFileChunks, DataBytesNeverCarryTheStatusBit) {
+    MidiFileWriter w;
+    ASSERT_EQ(createMidiFile(w, path), 1);
+    writeMidiHeader(w, 1, 1, 256);
+    beginMidiTrack(w);
+    writeMidiNoteOn(w, 0, 0, 200, 300);
+    writeMidiControlChange(w, 0, 0, MIDI_CC_REVERB, -4);
+    writeMidiProgramChange(w, 0, 0, 128);
+    endMidiTrack(w, 0);
+    ASSERT_EQ(finishMidiFile(w), 1);
+
+    Bytes expected = header(1);
+    append(expected, track({0x00, 0x90, 0x7F, 0x7F, 0x00, 0xB0, 0x5B, 0x00, 0x00, 0xC0, 0x7F, 0x00, 0xFF, 0x2F, 0x00}));
+    EXPECT_EQ(readFileBytes(path), expected);
+}
+
+TEST_F(MidiFileChunks, PitchBendsGoLowSevenBitsFirstAndStayWithinFourteenBits) {
+    MidiFileWriter w;
+    ASSERT_EQ(createMidiFile(w, path), 1);
+    writeMidiHeader(w, 1, 1, 256);
+    beginMidiTrack(w);
+    for (int value : {0, 8192, 16383, 9748, 192, 20000, -1}) writeMidiPitchBend(w, 0, 5, value);
+    endMidiTrack(w, 0);
+    ASSERT_EQ(finishMidiFile(w), 1);
+
+    Bytes expected = header(1);
+    append(expected, track({0x00, 0xE5, 0x00, 0x00, 0x00, 0xE5, 0x00, 0x40, 0x00, 0xE5, 0x7F, 0x7F,
+                            0x00, 0xE5, 0x14, 0x4C, 0x00, 0xE5, 0x40, 0x01, 0x00, 0xE5, 0x7F, 0x7F,
+                            0x00, 0xE5, 0x00, 0x00, 0x00, 0xFF, 0x2F, 0x00}));
+    EXPECT_EQ(readFileBytes(path), expected);
+}
+
+TEST(MidiFileText, TextIsWrittenInLatin1WithQuestionMarksForTheRest) {
+    EXPECT_EQ(latin1FromUtf8("Voice"), "Voice");
+    EXPECT_EQ(latin1FromUtf8("Fl\xC3\xBBte"), "Fl\xFBte");
+    EXPECT_EQ(latin1FromUtf8("R\xC3\xA9 \xE2\x99\xAA"), "R\xE9 ?");           // a note sign has no Latin-1 form
+    EXPECT_EQ(latin1FromUtf8("\xF0\x9F\x8E\xB5!"), "?!");                      // four-byte character
+    EXPECT_EQ(latin1FromUtf8("\xC3("), "?(");                                  // cut short
+    EXPECT_EQ(latin1FromUtf8("\xC0\x80" "a"), "??a");                          // overlong NUL
+    EXPECT_EQ(latin1FromUtf8("\xE2\x99"), "??");                               // sequence past the end
+}
+
+TEST_F(MidiFileChunks, ATrackNameIsCountedInLatin1Bytes) {
+    MidiFileWriter w;
+    ASSERT_EQ(createMidiFile(w, path), 1);
+    writeMidiHeader(w, 1, 1, 256);
+    beginMidiTrack(w);
+    writeMidiTextEvent(w, 0, MIDI_META_TRACK_NAME, "Fl\xC3\xBBte");
+    endMidiTrack(w, 0);
+    ASSERT_EQ(finishMidiFile(w), 1);
+    Bytes expected = header(1);
+    append(expected, track({0x00, 0xFF, 0x03, 0x05, 'F', 'l', 0xFB, 't', 'e', 0x00, 0xFF, 0x2F, 0x00}));
+    EXPECT_EQ(readFileBytes(path), expected);
+}
+
+// ---- failures ----
+
+using MidiFileFailures = MidiFileTest;
+
+// A small complete file, with a write failure injected at the nth write from the start.
+static int writeSmallFile(const std::string& path) {
+    MidiFileWriter w;
+    if (!createMidiFile(w, path)) return -1;
+    writeMidiHeader(w, 1, 1, 256);
+    beginMidiTrack(w);
+    writeMidiNoteOn(w, 0, 0, 60, 100);
+    writeMidiNoteOff(w, 256, 0, 60);
+    endMidiTrack(w, 1);
+    return finishMidiFile(w);
+}
+
+TEST_F(MidiFileFailures, AFileThatCannotBeCreatedIsRefusedWithoutAMessage) {
+    failFileCall(FILE_OP_OPEN, 1);
+    MidiFileWriter w;
+    EXPECT_EQ(createMidiFile(w, path), 0);
+    EXPECT_EQ(w.file, nullptr);
+    EXPECT_EQ(finishMidiFile(w), 0);
+    EXPECT_EQ(messageCount(), 0);
+    EXPECT_FALSE(fileExists(path));
+}
+
+TEST_F(MidiFileFailures, AShortWriteIsReportedOnceAndTheIncompleteFileRemoved) {
+    for (int n = 1; n <= 14; n++) {   // every write of the file, the length last
+        clearUiCalls();
+        failFileCall(FILE_OP_WRITE, n);
+        EXPECT_EQ(writeSmallFile(path), 0) << "write " << n;
+        EXPECT_EQ(messageCount(), 1) << "write " << n;
+        EXPECT_EQ(lastMessageText(), "Bytes were not stored properly");
+        EXPECT_FALSE(fileExists(path)) << "write " << n;
+        clearFileFailures();
+    }
+}
+
+TEST_F(MidiFileFailures, ASeekThatFailsWhileFillingInLengthsIsReported) {
+    failFileCall(FILE_OP_SEEK, 1);
+    EXPECT_EQ(writeSmallFile(path), 0);
+    EXPECT_EQ(messageCount(), 1);
+    EXPECT_EQ(lastMessageText(), "File could not be seeked");
+    EXPECT_FALSE(fileExists(path));
+}
+
+TEST_F(MidiFileFailures, ACloseThatFailsIsReportedAndTheFileRemoved) {
+    failFileCall(FILE_OP_CLOSE, 1);
+    EXPECT_EQ(writeSmallFile(path), 0);
+    EXPECT_EQ(lastMessageText(), "File could not be closed");
+    EXPECT_FALSE(fileExists(path));
+}
+
+TEST_F(MidiFileFailures, AWriterThatGivesUpLeavesNoFileBehind) {
+    MidiFileWriter w;
+    ASSERT_EQ(createMidiFile(w, path), 1);
+    writeMidiHeader(w, 1, 1, 256);
+    beginMidiTrack(w);
+    w.ok = 0;
+    EXPECT_EQ(finishMidiFile(w), 0);
+    EXPECT_EQ(messageCount(), 0);
+    EXPECT_FALSE(fileExists(path));
+}
