@@ -10,7 +10,7 @@ static const ResourceStringEntry resourceStrings[] = {
     {10230, "File could not be closed"},
     {10231, "File could not be seeked"},
     {10232, "Bytes were not stored properly"},
-    {10271, "Made with Torvellan Melodrift - www.torvellan.example"},
+    {10271, "Made with Torvellan Melodrift"},
     {10325, "Message from Torvellan Melodrift"},
     {10401, "Sorry - there is insufficient memory available to continue. Please try freeing up some memory "
             "from other applications."},

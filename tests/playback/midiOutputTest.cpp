@@ -29,7 +29,7 @@
 namespace fs = std::filesystem;
 using Bytes = std::vector<uint8_t>;
 
-static const char* const CREDIT_LINE = "Made with Torvellan Melodrift - www.torvellan.example";
+static const char* const CREDIT_LINE = "Made with Torvellan Melodrift";
 // One MIDI tick, seconds: the most a truncated time may lie early.
 static const double TICK_SECONDS = 1.0 / 512;
 
