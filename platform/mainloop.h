@@ -16,6 +16,8 @@ void postQuit(int exitCode);
 void signalCaptureEvent();
 // The handler called on the main thread when the capture event is signalled.
 void setCaptureEventHandler(void (*handler)());
+// The handler set last; a backend serving the event calls it.
+void (*captureEventHandler())();
 
 // Window timers: call every intervalMs (the design uses 10 ms) until stopped. Starting an
 // id that runs restarts it.
@@ -39,6 +41,7 @@ struct MainLoopBackend {
     void (*startTimer)(int id, int intervalMs, std::function<void()> call);
     void (*stopTimer)(int id);
     int (*run)(volatile uint32_t* quitFlag);
+    void (*stopAllTimers)();   // may be null: stopAllTimers() then stops only the headless timers
 };
 // Installs a backend; nullptr goes back to the headless loop.
 void setMainLoopBackend(const MainLoopBackend* backend);

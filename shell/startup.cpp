@@ -12,8 +12,12 @@
 #include "platform/mainloop.h"
 #include "platform/sync.h"
 #include "platform/ui.h"
+#include "shell/appTimers.h"
+#include "shell/mainFrame.h"
+#include "shell/openQueue.h"
 #include "shell/paths.h"
 #include "shell/quitFlag.h"
+#include "shell/saveSong.h"
 #include "shell/settings.h"
 #include "store/fileRoutines.h"
 #include "store/song.h"
@@ -102,6 +106,7 @@ int startUp(const StartupOptions& options) {
     if (!quitFlag && !loadGlobalSettings()) quitFlag = 1;
     if (!quitFlag && !loadAudioGlobalSettings()) quitFlag = 1;
     appState.settingsLoaded = !quitFlag;
+    applyDisplayModeSettings();
 
     if (appState.hooks.createMainFrame && !appState.hooks.createMainFrame()) quitFlag = 1;
 
@@ -114,6 +119,7 @@ int startUp(const StartupOptions& options) {
     appState.directSoundAvailable = appState.hooks.createCaptureObject && appState.hooks.createCaptureObject();
 
     resetSong();
+    resetSongNames();
     createNamedMutexes();
     emptyUndoFolder();
     deleteWorkingFiles();
@@ -156,6 +162,8 @@ static void deleteDocumentTemporaries() {
 
 int shutDown(int exitCode) {
     setCaptureEventHandler(nullptr);
+    resetOpenQueue();
+    resetAppTimers();
     stopAllTimers();
 
     deleteReportedFile(sharedFilePath("!Unsaved"));

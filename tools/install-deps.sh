@@ -12,6 +12,7 @@ packages=(
   libfluidsynth-dev timgm6mb-soundfont
   pulseaudio pulseaudio-utils libpulse-dev
   fonts-dejavu-core fonts-liberation
+  xvfb xauth imagemagick
   libgtest-dev libgmock-dev libbenchmark-dev libfftw3-dev
 )
 missing=()

@@ -157,7 +157,7 @@ static int headlessRun(volatile uint32_t* quitFlag) {
 }
 
 static const MainLoopBackend headlessBackend = {headlessPost,       headlessPostQuit, headlessSignal,
-                                                headlessStartTimer, headlessStopTimer, headlessRun};
+                                                headlessStartTimer, headlessStopTimer, headlessRun, nullptr};
 
 static const MainLoopBackend& backend() { return installedBackend ? *installedBackend : headlessBackend; }
 
@@ -170,6 +170,11 @@ void setCaptureEventHandler(void (*handler)()) {
     loop.captureHandler = handler;
 }
 
+void (*captureEventHandler())() {
+    std::lock_guard<std::mutex> guard(loop.lock);
+    return loop.captureHandler;
+}
+
 void startTimer(int id, int intervalMs, std::function<void()> call) {
     backend().startTimer(id, intervalMs, std::move(call));
 }
@@ -177,6 +182,7 @@ void startTimer(int id, int intervalMs, std::function<void()> call) {
 void stopTimer(int id) { backend().stopTimer(id); }
 
 void stopAllTimers() {
+    if (installedBackend && installedBackend->stopAllTimers) installedBackend->stopAllTimers();
     std::lock_guard<std::mutex> guard(loop.lock);
     loop.timers.clear();
 }
