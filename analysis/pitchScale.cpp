@@ -61,3 +61,14 @@ int frequencyToHalfSemitone(double frequency, double middleA) {
     if (!(frequency > 0.0)) return 0;
     return roundHalfSemitone(unlimitedPitch(frequency, middleA));
 }
+
+const double* noteFrequencyTable() {
+    struct Table {
+        double frequencies[NOTE_FREQUENCY_COUNT];   // Hz
+        Table() {
+            for (int i = 0; i < NOTE_FREQUENCY_COUNT; i++) frequencies[i] = 13.75 * std::exp2((i - 9) / 12.0);
+        }
+    };
+    static const Table table;   // built on first use; thread safe
+    return table.frequencies;
+}

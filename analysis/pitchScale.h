@@ -26,3 +26,9 @@ int frequencyToHalfSemitone(double frequency, double middleA = DEFAULT_MIDDLE_A)
 int roundSemitone(double pitch);
 // The rounding of frequencyToHalfSemitone for a pitch already in hand (0 when not finite).
 int roundHalfSemitone(double pitch);
+
+// The equal-tempered note frequencies with A = 440 Hz whatever the instrument:
+// 13.75 x 2^((i - 9) / 12) Hz for the MIDI notes i = 0 .. NOTE_FREQUENCY_COUNT - 1. Built once;
+// the analysis derives its resolution levels from it and recognition snaps phrases to it.
+constexpr int NOTE_FREQUENCY_COUNT = 128;
+const double* noteFrequencyTable();

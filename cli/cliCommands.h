@@ -18,3 +18,5 @@ const CliCommand* findCliCommand(const std::string& name);
 
 // info FILE: what the wave reader finds in FILE, or why it refuses it.
 int runInfoCommand(const std::vector<std::string>& arguments);
+// analyse IN.wav --ft-csv OUT.csv: the frequency tables of IN.wav, one CSV row per entry.
+int runAnalyseCommand(const std::vector<std::string>& arguments);
