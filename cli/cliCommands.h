@@ -20,3 +20,5 @@ const CliCommand* findCliCommand(const std::string& name);
 int runInfoCommand(const std::vector<std::string>& arguments);
 // analyse IN.wav --ft-csv OUT.csv: the frequency tables of IN.wav, one CSV row per entry.
 int runAnalyseCommand(const std::vector<std::string>& arguments);
+// learn-instrument [--replace] [--output FILE] FILE...: instrument definitions learnt from recordings.
+int runLearnInstrumentCommand(const std::vector<std::string>& arguments);

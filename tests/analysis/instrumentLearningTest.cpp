@@ -1,0 +1,538 @@
+// Learning instrument definitions: pitch names, the parameters of a recording's file name,
+// the notes of a recording, one note's harmonics from FT blocks built in code (positions,
+// re-referencing, sorting, the limits and their messages), learning and replacing through
+// the table and the file, and whole recordings made in code analysed by the program.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cmath>
+#include <string>
+#include <vector>
+
+#include "analysis/instrumentFixtures.h"
+#include "analysis/instrumentLearning.h"
+#include "analysis/pitchScale.h"
+#include "analysis/signalGenerator.h"
+#include "audio/waveFixtures.h"
+
+static const double BLOCK = 1.0 / 64;   // seconds of a block in recordings built in code
+static const double CENTS = 1.0;        // tolerances in cents
+
+static double centsBetween(double a, double b) { return 1200.0 * std::fabs(std::log2(a / b)); }
+
+// One frequency of a note built in code: present with amplitude in blocks [from, to) of the note.
+struct Partial {
+    double frequency;
+    uint8_t amplitude;
+    uint32_t from;
+    uint32_t to;
+};
+
+static void addEntry(FTDataBuffer& b, double frequency, uint8_t amplitude) {
+    FrequencyEntry& e = b.entries[b.nEntries++];
+    e.frequency = float(frequency);
+    e.frequencyWidth = float(frequency * 0.0250858);
+    e.amplitude = amplitude;
+    e.initialAmplitude = amplitude;
+    e.cutOffLevel = 0;
+    e.entryFlags = 0;
+}
+
+static FTDataBuffer emptyBlock() {
+    FTDataBuffer b{};
+    return b;
+}
+
+static LearningRecording emptyRecording(double blockDuration = BLOCK) {
+    LearningRecording r{};
+    r.blockDuration = blockDuration;
+    r.lowAmplitudesRemoved = 1;
+    return r;
+}
+
+// Appends a note of length blocks holding partials (in ascending frequency), then gap empty blocks.
+static void appendNote(LearningRecording& r, uint32_t length, std::vector<Partial> partials, uint32_t gap = 10) {
+    std::sort(partials.begin(), partials.end(),
+              [](const Partial& a, const Partial& b) { return a.frequency < b.frequency; });
+    for (uint32_t b = 0; b < length; b++) {
+        FTDataBuffer block = emptyBlock();
+        for (const Partial& p : partials)
+            if (b >= p.from && b < p.to) addEntry(block, p.frequency, p.amplitude);
+        r.blocks.push_back(block);
+    }
+    for (uint32_t b = 0; b < gap; b++) r.blocks.push_back(emptyBlock());
+}
+
+// A chromatic scale from low, count notes of 20 blocks, each a fundamental and its octave.
+static LearningRecording scaleRecording(int low, int count, uint8_t level = 200) {
+    LearningRecording r = emptyRecording();
+    for (int b = 0; b < 10; b++) r.blocks.push_back(emptyBlock());
+    for (int k = 0; k < count; k++) {
+        double f = pitchToFrequency(low + k);
+        appendNote(r, 20, {{f, level, 0, 20}, {2 * f, uint8_t(level / 2), 0, 20}});
+    }
+    return r;
+}
+
+// ---- pitch names ----
+
+class PitchName : public InstrumentTest {};
+
+TEST_F(PitchName, NamesGiveTheirMidiNotes) {
+    struct Case {
+        const char* text;
+        int note;
+    };
+    for (Case c : {Case{"A4", 69}, Case{"C4", 60}, Case{"C#4", 61}, Case{"Db4", 61}, Case{"G3", 55}, Case{"B4", 71},
+                   Case{"C0", 12}, Case{"B8", 119}, Case{"a4", 69}, Case{"e2", 40}, Case{"Eb3", 51}, Case{"F#5", 78},
+                   Case{"pitch C 4", 60}})
+        EXPECT_EQ(parsePitchName(c.text, 1), c.note) << c.text;
+    EXPECT_EQ(messageCount(), 0);
+}
+
+TEST_F(PitchName, TheFirstSharpOrFlatAnywhereDecidesSoALowerCaseBIsFlat) {
+    EXPECT_EQ(parsePitchName("b4", 1), 70);     // the letter b is also the first flat
+    EXPECT_EQ(parsePitchName("B4", 1), 71);
+    EXPECT_EQ(parsePitchName("C4#", 1), 61);
+    EXPECT_EQ(parsePitchName("D#b4", 1), 63);   // the first of the two counts
+    EXPECT_EQ(parsePitchName("Db#4", 1), 61);
+}
+
+TEST_F(PitchName, AnAccidentalThatWouldReachAnotherLettersSemitoneIsIgnored) {
+    EXPECT_EQ(parsePitchName("B#4", 1), 71);
+    EXPECT_EQ(parsePitchName("Cb4", 1), 60);
+    EXPECT_EQ(parsePitchName("E#4", 1), 64);
+    EXPECT_EQ(parsePitchName("Fb4", 1), 65);
+}
+
+TEST_F(PitchName, TheOctaveIsTheFirstDigitUpToEightAndNinesArePassedOver) {
+    EXPECT_EQ(parsePitchName("A94", 1), 69);
+    EXPECT_EQ(parsePitchName("C45", 1), 60);
+    EXPECT_EQ(parsePitchName("G9", 1), 0);
+    EXPECT_EQ(lastMessageText(), "Cannot interpret pitch in 'G9'");
+}
+
+TEST_F(PitchName, NoLetterOrNoDigitIsReportedOnlyWhenAsked) {
+    EXPECT_EQ(parsePitchName("H4", 1), 0);
+    EXPECT_EQ(lastMessageText(), "Cannot interpret pitch in 'H4'");
+    EXPECT_EQ(parsePitchName("C", 1), 0);
+    EXPECT_EQ(lastMessageText(), "Cannot interpret pitch in 'C'");
+    EXPECT_EQ(parsePitchName("", 1), 0);
+    EXPECT_EQ(lastMessageText(), "Cannot interpret pitch in ''");
+    clearUiCalls();
+    EXPECT_EQ(parsePitchName("H4", 0), 0);
+    EXPECT_EQ(messageCount(), 0);
+}
+
+// ---- file name parameters ----
+
+class InstrumentFileName : public InstrumentTest {};
+
+TEST_F(InstrumentFileName, TheExtensionGoesButADecimalPointStays) {
+    EXPECT_EQ(instrumentFileStem("/a/b.c/Flute_Real_Studio_440.0_C4_B4_0.wav"), "Flute_Real_Studio_440.0_C4_B4_0");
+    EXPECT_EQ(instrumentFileStem("Flute_Real_Studio_440.0_C4_B4_0"), "Flute_Real_Studio_440.0_C4_B4_0");
+    EXPECT_EQ(instrumentFileStem("x/Flute_Real_Studio_440_C4_B4_0.WAV"), "Flute_Real_Studio_440_C4_B4_0");
+}
+
+TEST_F(InstrumentFileName, SevenParametersDescribeADefinitionToLearn) {
+    InstrumentFileParameters p{};
+    ASSERT_EQ(readInstrumentFileParameters("rec/Alto Sax_Real_Studio_442.5_Db3_Ab5_1.wav", 0, &p), 1);
+    EXPECT_EQ(p.name, "Alto Sax");
+    EXPECT_EQ(p.kind, "Real");
+    EXPECT_EQ(p.source, "Studio");
+    EXPECT_EQ(p.middleA, 442.5f);
+    EXPECT_EQ(p.lowSemitone, 49);
+    EXPECT_EQ(p.highSemitone, 80);
+    EXPECT_EQ(p.sampleNumber, 1);
+    ASSERT_EQ(readInstrumentFileParameters("Flute_Real_Studio_440_E4_0.wav", 1, &p), 1);
+    EXPECT_EQ(p.lowSemitone, 64);
+    EXPECT_EQ(p.highSemitone, 64);
+    EXPECT_EQ(p.sampleNumber, 0);
+    EXPECT_EQ(messageCount(), 0);
+}
+
+TEST_F(InstrumentFileName, TooFewOrTooManyParametersAreReportedWithTheFileName) {
+    InstrumentFileParameters p{};
+    EXPECT_EQ(readInstrumentFileParameters("rec/Flute_Real_Studio_440.0_C4_B4.wav", 0, &p), 0);
+    EXPECT_EQ(lastMessageText(), "There are too few instrument definition parameters in filename data in "
+                                 "'Flute_Real_Studio_440.0_C4_B4.wav'");
+    EXPECT_EQ(readInstrumentFileParameters("Flute_Real_Studio_440.0_C4_B4_0_x.wav", 0, &p), 0);
+    EXPECT_EQ(lastMessageText(), "There are too many instrument definition parameters in filename data in "
+                                 "'Flute_Real_Studio_440.0_C4_B4_0_x.wav'");
+    EXPECT_EQ(readInstrumentFileParameters("Flute_Real_Studio_440.0_C4_B4_0.wav", 1, &p), 0);
+    EXPECT_EQ(lastMessageText(), "There are too many instrument definition parameters in filename data in "
+                                 "'Flute_Real_Studio_440.0_C4_B4_0.wav'");
+}
+
+TEST_F(InstrumentFileName, PitchesAndTheMiddleAThatCannotBeReadAreReported) {
+    InstrumentFileParameters p{};
+    EXPECT_EQ(readInstrumentFileParameters("Flute_Real_Studio_440.0_H4_B4_0.wav", 0, &p), 0);
+    EXPECT_EQ(lastMessageText(), "Cannot interpret pitch in 'H4'");
+    EXPECT_EQ(readInstrumentFileParameters("Flute_Real_Studio_440.0_C4_H4_0.wav", 0, &p), 0);
+    EXPECT_EQ(lastMessageText(), "Cannot interpret pitch in 'H4'");
+    EXPECT_EQ(readInstrumentFileParameters("Flute_Real_Studio_A440_C4_B4_0.wav", 0, &p), 0);
+    EXPECT_EQ(lastMessageText(), "Cannot interpret middle A in 'A440'");
+    EXPECT_EQ(readInstrumentFileParameters("Flute_Real_Studio_0_C4_B4_0.wav", 0, &p), 0);
+    EXPECT_EQ(lastMessageText(), "Cannot interpret middle A in '0'");
+    EXPECT_EQ(readInstrumentFileParameters("Flute_Real_Studio_440_B4_C4_0.wav", 0, &p), 0);
+    EXPECT_EQ(lastMessageText(),
+              "The low pitch is above the high pitch in filename data in 'Flute_Real_Studio_440_B4_C4_0.wav'");
+}
+
+// ---- finding notes ----
+
+class InstrumentNotesFound : public InstrumentTest {};
+
+TEST_F(InstrumentNotesFound, ANoteMustBeLouderThan64AndLastAtLeast80Milliseconds) {
+    LearningRecording r = emptyRecording();
+    appendNote(r, 6, {{440, 65, 0, 6}});   // 6 blocks of 1/64 s: 0.094 s
+    appendNote(r, 5, {{440, 200, 0, 5}});  // 0.078 s: too short
+    appendNote(r, 9, {{440, 64, 0, 9}});   // not louder than 64
+    appendNote(r, 9, {{440, 40, 0, 9}, {880, 25, 0, 9}}, 0);   // the block sums count: 65
+    std::vector<LearningNote> notes = findLearningNotes(r);
+    ASSERT_EQ(notes.size(), 2u);
+    EXPECT_EQ(notes[0].start, 0u);
+    EXPECT_EQ(notes[0].end, 6u);
+    EXPECT_EQ(notes[1].start, 16u + 15u + 19u);
+    EXPECT_EQ(notes[1].end, 59u);
+}
+
+TEST_F(InstrumentNotesFound, AtMost128NotesAreFound) {
+    LearningRecording r = emptyRecording();
+    for (int k = 0; k < 130; k++) appendNote(r, 8, {{440, 100, 0, 8}}, 2);
+    EXPECT_EQ(findLearningNotes(r).size(), 128u);
+}
+
+// ---- learning one note ----
+
+class InstrumentNoteLearning : public InstrumentTest {
+protected:
+    NoteSample learn(const LearningRecording& r, double middleA = 440.0, int expected = 1) {
+        NoteSample sample;
+        EXPECT_EQ(learnNoteSample(r, 0, 20, middleA, &sample), expected);
+        return sample;
+    }
+};
+
+TEST_F(InstrumentNoteLearning, EachSteadyFrequencyBecomesAHarmonicWithItsPositionsAndMeanAmplitude) {
+    LearningRecording r = emptyRecording();
+    appendNote(r, 20, {{220, 200, 0, 20}, {440, 100, 5, 20}, {1000, 250, 3, 5}});
+    NoteSample s = learn(r);
+    EXPECT_EQ(s.duration, float(20 * BLOCK));
+    EXPECT_EQ(s.level, (200u * 20 + 100 * 15 + 250 * 2) / 20);
+    ASSERT_EQ(s.harmonicCount, 2);   // 1000 Hz lasts two blocks only
+    const Harmonic& a = s.harmonics[0];
+    EXPECT_NEAR(a.frequency, 220.0, 1e-3);
+    EXPECT_NEAR(a.noteFrequency, 220.0, 1e-3);
+    EXPECT_EQ(a.meanAmplitude, 200u);
+    EXPECT_EQ(a.startPosition, 0);
+    EXPECT_EQ(a.endPosition, 255);   // (19 + 2) x 255 / 20, capped
+    EXPECT_EQ(a.toleranceMeasures[0], 0x0F);   // no spread above, a steady amplitude
+    EXPECT_EQ(a.toleranceMeasures[1], 0x00);
+    EXPECT_EQ(a.onsetMeasures, 0x25);          // two blocks of attack at 1/64 s
+    EXPECT_EQ(a.peakAmplitude, 200u);
+    EXPECT_EQ(a.presentBlocks, 20);
+    EXPECT_EQ(a.noteBlocks, 20);
+    EXPECT_EQ(a.onsetShape, 256);
+    EXPECT_EQ(a.decayShape, 256);
+    const Harmonic& b = s.harmonics[1];
+    EXPECT_NEAR(b.frequency, 440.0, 1e-3);
+    EXPECT_EQ(b.meanAmplitude, 75u);   // 100 x 15 blocks / 20
+    EXPECT_EQ(b.startPosition, 64);    // 5 x 255 / 20 = 63.75
+    EXPECT_EQ(b.endPosition, 255);
+    EXPECT_EQ(b.onsetShape, 128);      // half the strongest harmonic's mean
+    EXPECT_EQ(b.presentBlocks, 15);
+}
+
+TEST_F(InstrumentNoteLearning, TheStrongestHarmonicsOnsetBecomesTheNotesStart) {
+    LearningRecording r = emptyRecording();
+    appendNote(r, 20, {{220, 200, 4, 20}, {440, 60, 8, 14}, {660, 50, 0, 20}});
+    NoteSample s = learn(r);
+    ASSERT_EQ(s.harmonicCount, 3);
+    // Strongest: 220 Hz from block 4, position 51; the others are moved by it and stretched.
+    EXPECT_NEAR(s.harmonics[0].frequency, 220.0, 1e-3);
+    EXPECT_EQ(s.harmonics[0].startPosition, 0);
+    EXPECT_EQ(s.harmonics[0].endPosition, 255);
+    EXPECT_NEAR(s.harmonics[1].frequency, 660.0, 1e-3);
+    EXPECT_EQ(s.harmonics[1].startPosition, 0);   // before the strongest one's onset
+    EXPECT_EQ(s.harmonics[1].endPosition, 255);
+    EXPECT_NEAR(s.harmonics[2].frequency, 440.0, 1e-3);
+    EXPECT_EQ(s.harmonics[2].startPosition, 63);  // 102 -> (102 - 51) x 255 / 204
+    EXPECT_EQ(s.harmonics[2].endPosition, 175);   // 191 -> (191 - 51) x 255 / 204
+}
+
+TEST_F(InstrumentNoteLearning, HarmonicsAreSortedByLengthTimesMeanAmplitude) {
+    LearningRecording r = emptyRecording();
+    // 300 Hz is the loudest entry but lasts 4 blocks; 200 Hz is quieter and lasts the note.
+    appendNote(r, 20, {{200, 100, 0, 20}, {300, 250, 0, 4}, {500, 90, 0, 20}});
+    NoteSample s = learn(r);
+    ASSERT_EQ(s.harmonicCount, 3);
+    EXPECT_NEAR(s.harmonics[0].frequency, 200.0, 1e-3);
+    EXPECT_NEAR(s.harmonics[1].frequency, 500.0, 1e-3);
+    EXPECT_NEAR(s.harmonics[2].frequency, 300.0, 1e-3);
+}
+
+TEST_F(InstrumentNoteLearning, AHarmonicNeedsThreeBlocksInARowAndEndsAtItsFirstGap) {
+    LearningRecording r = emptyRecording();
+    appendNote(r, 20, {{220, 200, 0, 10}, {220, 200, 11, 20}, {500, 150, 2, 4}, {500, 150, 6, 8}});
+    NoteSample s = learn(r);
+    ASSERT_EQ(s.harmonicCount, 1);
+    EXPECT_EQ(s.harmonics[0].meanAmplitude, 100u);   // ten blocks of 200 over twenty
+    EXPECT_EQ(s.harmonics[0].endPosition, 140);      // (9 + 2) x 255 / 20 = 140.25
+}
+
+TEST_F(InstrumentNoteLearning, TheNearestNoteFollowsTheDefinitionsMiddleA) {
+    LearningRecording r = emptyRecording();
+    appendNote(r, 20, {{442.0, 200, 0, 20}});
+    EXPECT_NEAR(learn(r, 442.0).harmonics[0].noteFrequency, 442.0, 1e-3);
+    EXPECT_NEAR(learn(r, 440.0).harmonics[0].noteFrequency, 440.0, 1e-3);
+}
+
+TEST_F(InstrumentNoteLearning, AttackLengthFollowsTheBlockDuration) {
+    LearningRecording r = emptyRecording(1.0 / 128);
+    appendNote(r, 20, {{440.0, 200, 0, 20}});
+    EXPECT_EQ(learn(r).harmonics[0].onsetMeasures, 0x55);   // 0.04 s is five blocks of 1/128 s
+}
+
+TEST_F(InstrumentNoteLearning, ThirtyTwoHarmonicsEndTheNoteWithTheMessage) {
+    LearningRecording r = emptyRecording();
+    std::vector<Partial> partials;
+    for (int k = 0; k < 40; k++) partials.push_back({100.0 * std::pow(1.1, k), uint8_t(250 - k), 0, 20});
+    appendNote(r, 20, partials);
+    NoteSample s = learn(r, 440.0, 0);
+    EXPECT_EQ(s.harmonicCount, 32);
+    EXPECT_EQ(lastMessageText(),
+              "Cannot learn note as found too many harmonics - Increase MAX_CS_HARMONICS definition in Instruments");
+}
+
+TEST_F(InstrumentNoteLearning, AFullIgnoreListEndsTheNoteWithTheMessage) {
+    LearningRecording r = emptyRecording();
+    // Three hundred frequencies, a semitone and more apart, each present in one block only.
+    for (int b = 0; b < 20; b++) {
+        FTDataBuffer block = emptyBlock();
+        for (int k = 0; k < 15; k++) addEntry(block, 30.0 * std::pow(1.07, b * 15 + k), 200);
+        r.blocks.push_back(block);
+    }
+    NoteSample s = learn(r, 440.0, 0);
+    EXPECT_EQ(s.harmonicCount, 0);
+    EXPECT_EQ(messageCount(), 1);
+    EXPECT_EQ(lastMessageText(), "Cannot learn note - Increase MaxIgnoreFrequencies constant in AnalyseNote");
+}
+
+TEST_F(InstrumentNoteLearning, EntriesThatAreNotFrequenciesAreIgnoredWithoutLooping) {
+    LearningRecording r = emptyRecording();
+    appendNote(r, 20, {{220, 200, 0, 20}});
+    for (int b = 0; b < 20; b++) {
+        addEntry(r.blocks[size_t(b)], std::nan(""), 255);
+        addEntry(r.blocks[size_t(b)], -5.0, 255);
+        addEntry(r.blocks[size_t(b)], 0.0, 255);
+    }
+    NoteSample s = learn(r);
+    ASSERT_EQ(s.harmonicCount, 1);
+    EXPECT_NEAR(s.harmonics[0].frequency, 220.0, 1e-3);
+}
+
+// ---- learning and replacing through the table ----
+
+class InstrumentLearning : public InstrumentTest {
+protected:
+    std::string recordingPath(const std::string& name) const { return folder.file(name); }
+    // A wave file of count notes from low (0.3 s each after 0.2 s of silence), 22050 Hz.
+    void writeScale(const std::string& name, int low, int count, std::vector<double> harmonics = {1.0, 0.5, 0.3}) {
+        std::vector<double> x = silenceSignal(0.3, 22050);
+        for (int k = 0; k < count; k++) {
+            std::vector<double> note = toneSignal(pitchToFrequency(low + k), 8000, 0.3, 22050, harmonics);
+            x.insert(x.end(), note.begin(), note.end());
+            std::vector<double> gap = silenceSignal(0.2, 22050);
+            x.insert(x.end(), gap.begin(), gap.end());
+        }
+        writeFileBytes(recordingPath(name), pcmWave(1, 22050, 16, toSampleBytes(x, 16)));
+    }
+};
+
+TEST_F(InstrumentLearning, TwelveNotesAreLearntIntoSixtyToSeventyOne) {
+    writeScale("Flute_Real_Studio_440.0_C4_B4_0.wav", 60, 12);
+    ASSERT_EQ(learnFromFile(recordingPath("Flute_Real_Studio_440.0_C4_B4_0.wav"), 0), 1) << lastMessageText();
+    EXPECT_EQ(messageCount(), 0) << lastMessageText();
+    ASSERT_EQ(loadInstrumentDefinitions(), 1);
+    ASSERT_EQ(instrumentDefinitions.definitions.size(), 1u);
+    const InstrumentDefinition& d = instrumentDefinitions.definitions[0];
+    EXPECT_EQ(instrumentDefinitionText(d),
+              "Flute (Real) - Studio. MIDI voice is 73. Max notes in chord is 1. Middle A is 440.00Hz. Semitone range "
+              "is 60 to 71. Score thresholds: 70.0%, 30.0%, 10.0%.");
+    ASSERT_EQ(d.semitones.size(), 12u);
+    for (int k = 0; k < 12; k++) {
+        const NoteSampleSet& set = d.semitones[size_t(k)];
+        ASSERT_EQ(set.sampleCount, 1) << k;
+        const NoteSample& s = set.samples[0];
+        EXPECT_NEAR(s.duration, 0.3, 0.05) << k;
+        ASSERT_GE(s.harmonicCount, 2) << k;
+        double f = pitchToFrequency(60 + k);
+        EXPECT_LT(centsBetween(s.harmonics[0].frequency, f), 20 * CENTS) << k;
+        EXPECT_NEAR(s.harmonics[0].noteFrequency, f, f * 1e-6) << k;
+        EXPECT_LT(centsBetween(s.harmonics[1].frequency, 2 * f), 20 * CENTS) << k;
+        EXPECT_EQ(s.harmonics[0].startPosition, 0) << k;
+    }
+    // The song's stores were only borrowed.
+    EXPECT_EQ(song.blockCount, 0u);
+    EXPECT_FALSE(recognitionOptions.learningInstruments);
+}
+
+TEST_F(InstrumentLearning, ElevenNotesAreRejectedWithTheCountMessage) {
+    writeScale("Flute_Real_Studio_440.0_C4_B4_0.wav", 60, 11);
+    EXPECT_EQ(learnFromFile(recordingPath("Flute_Real_Studio_440.0_C4_B4_0.wav"), 0), 0);
+    EXPECT_EQ(lastMessageText(), "The number of notes (11) found in the waveform 'Flute_Real_Studio_440.0_C4_B4_0.wav' "
+                                 "does not match the number of notes specified in the filename (12).");
+    EXPECT_TRUE(instrumentDefinitions.definitions.empty());
+    EXPECT_FALSE(fileExists(definitionsPath()));
+}
+
+TEST_F(InstrumentLearning, ASingleNoteReplacesTheLearntSampleOfItsPitch) {
+    writeScale("Flute_Real_Studio_440.0_C4_B4_0.wav", 60, 12);
+    ASSERT_EQ(learnFromFile(recordingPath("Flute_Real_Studio_440.0_C4_B4_0.wav"), 0), 1) << lastMessageText();
+    InstrumentDefinition before = instrumentDefinitions.definitions.at(0);
+    writeScale("Flute_Real_Studio_440.0_E4_0.wav", 64, 1, {1.0});
+    ASSERT_EQ(learnFromFile(recordingPath("Flute_Real_Studio_440.0_E4_0.wav"), 1), 1) << lastMessageText();
+    ASSERT_EQ(loadInstrumentDefinitions(), 1);
+    const InstrumentDefinition& after = instrumentDefinitions.definitions.at(0);
+    // The new recording of E4 is a pure tone: its sample has lost the octave the scale's had.
+    auto octaves = [](const NoteSample& s) {
+        int n = 0;
+        for (int k = 0; k < s.harmonicCount; k++)
+            n += centsBetween(s.harmonics[k].frequency, 2 * pitchToFrequency(64)) < 20 * CENTS;
+        return n;
+    };
+    EXPECT_EQ(after.semitones[4].sampleCount, 1);
+    EXPECT_EQ(octaves(before.semitones[4].samples[0]), 1);
+    EXPECT_EQ(octaves(after.semitones[4].samples[0]), 0);
+    EXPECT_LT(centsBetween(after.semitones[4].samples[0].harmonics[0].frequency, pitchToFrequency(64)), 20 * CENTS);
+    for (size_t k : {3, 5}) EXPECT_EQ(after.semitones[k].samples[0].level, before.semitones[k].samples[0].level);
+}
+
+TEST_F(InstrumentLearning, AnOpenSongOrAFrequencyTableFileIsNotAnalysed) {
+    LearningRecording r{};
+    song.blockCount = 5;
+    EXPECT_EQ(analyseLearningFile(recordingPath("Flute_Real_Studio_440.0_C4_B4_0.wav"), &r), 0);
+    EXPECT_EQ(lastMessageText(), "Please close the song before learning instruments.");
+    song.blockCount = 0;
+    EXPECT_EQ(analyseLearningFile(recordingPath("Flute_Real_Studio_440.0_C4_B4_0.ftb"), &r), 0);
+    EXPECT_EQ(lastMessageText(), "Frequency table files cannot be learnt from: 'Flute_Real_Studio_440.0_C4_B4_0.ftb'.");
+    EXPECT_EQ(analyseLearningFile(recordingPath("Flute_Real_Studio_440.0_C4_B4_0.wav"), &r), 0);
+    EXPECT_EQ(lastMessageText(), "This file cannot be opened. Please check it is not open in another application.");
+}
+
+TEST_F(InstrumentLearning, ScalesBuiltInCodeAreLearntWithTheVoiceOfTheName) {
+    ASSERT_EQ(learnFromRecording("Alto Sax_Real_Studio_440_C4_E4_0.wav", 0, scaleRecording(60, 5)), 1);
+    ASSERT_EQ(learnFromRecording("Guitar_Real_Studio_440_E2_G2_0.wav", 0, scaleRecording(40, 4)), 1);
+    const std::vector<InstrumentDefinition>& t = instrumentDefinitions.definitions;
+    ASSERT_EQ(t.size(), 2u);
+    EXPECT_EQ(t[0].midiVoice, 65);
+    EXPECT_EQ(t[0].maxNotesInChord, 1);
+    EXPECT_EQ(t[1].midiVoice, 24);
+    EXPECT_EQ(t[1].maxNotesInChord, 6);
+    EXPECT_EQ(instrumentDefinitions.current, 1);
+    EXPECT_NEAR(t[1].semitones[3].samples[0].harmonics[0].frequency, pitchToFrequency(43), 1e-3);
+}
+
+TEST_F(InstrumentLearning, ASecondSampleIsAddedToTheDefinitionWithTheSameNamesTuningAndRange) {
+    ASSERT_EQ(learnFromRecording("Flute_Real_Studio_440_C4_D4_0.wav", 0, scaleRecording(60, 3, 200)), 1);
+    ASSERT_EQ(learnFromRecording("Flute_Real_Studio_440_C4_D4_1.wav", 0, scaleRecording(60, 3, 100)), 1);
+    ASSERT_EQ(learnFromRecording("Flute_Real_Studio_442_C4_D4_1.wav", 0, scaleRecording(60, 3, 100)), 1);
+    ASSERT_EQ(loadInstrumentDefinitions(), 1);
+    const std::vector<InstrumentDefinition>& t = instrumentDefinitions.definitions;
+    ASSERT_EQ(t.size(), 2u);   // another middle A is another definition
+    for (const NoteSampleSet& set : t[0].semitones) {
+        ASSERT_EQ(set.sampleCount, 2);
+        EXPECT_EQ(set.samples[0].harmonics[0].meanAmplitude, 200u);
+        EXPECT_EQ(set.samples[1].harmonics[0].meanAmplitude, 100u);
+    }
+    // Sample 1 of a new definition comes with an empty sample 0.
+    for (const NoteSampleSet& set : t[1].semitones) {
+        ASSERT_EQ(set.sampleCount, 2);
+        EXPECT_EQ(set.samples[0].harmonicCount, 0);
+        EXPECT_EQ(set.samples[0].duration, 0.0f);
+        EXPECT_EQ(set.samples[1].harmonicCount, 2);
+    }
+    EXPECT_NEAR(t[1].semitones[0].samples[1].harmonics[0].noteFrequency, pitchToFrequency(60, 442.0), 1e-3);
+}
+
+TEST_F(InstrumentLearning, ANameLongerThanTheFileHoldsFindsItsDefinitionAfterAReload) {
+    std::string name(40, 'L');
+    ASSERT_EQ(learnFromRecording(name + "_Real_Studio_440_C4_D4_0.wav", 0, scaleRecording(60, 3)), 1);
+    ASSERT_EQ(loadInstrumentDefinitions(), 1);
+    ASSERT_EQ(learnFromRecording(name + "_Real_Studio_440_C4_D4_1.wav", 0, scaleRecording(60, 3)), 1);
+    ASSERT_EQ(instrumentDefinitions.definitions.size(), 1u);
+    EXPECT_EQ(instrumentDefinitions.definitions[0].name, std::string(32, 'L'));
+    EXPECT_EQ(instrumentDefinitions.definitions[0].semitones[2].sampleCount, 2);
+}
+
+TEST_F(InstrumentLearning, ASampleNumberOfTwoIsOutOfRangeOnceTheCountMatches) {
+    EXPECT_EQ(learnFromRecording("Flute_Real_Studio_440_C4_D4_2.wav", 0, scaleRecording(60, 2)), 0);
+    EXPECT_EQ(lastMessageText(), "The number of notes (2) found in the waveform 'Flute_Real_Studio_440_C4_D4_2.wav' "
+                                 "does not match the number of notes specified in the filename (3).");
+    EXPECT_EQ(learnFromRecording("Flute_Real_Studio_440_C4_D4_2.wav", 0, scaleRecording(60, 3)), 0);
+    EXPECT_EQ(lastMessageText(), "Pitch sample number out of range in waveform 'Flute_Real_Studio_440_C4_D4_2.wav'.");
+    EXPECT_EQ(learnFromRecording("Flute_Real_Studio_440_C4_D4_x.wav", 0, scaleRecording(60, 3)), 0);
+    EXPECT_EQ(lastMessageText(), "Pitch sample number out of range in waveform 'Flute_Real_Studio_440_C4_D4_x.wav'.");
+    EXPECT_TRUE(instrumentDefinitions.definitions.empty());
+}
+
+TEST_F(InstrumentLearning, TheParameterMessagesStopLearning) {
+    EXPECT_EQ(learnFromRecording("Flute_Real_Studio_440.0_C4_B4.wav", 0, scaleRecording(60, 12)), 0);
+    EXPECT_EQ(lastMessageText(), "There are too few instrument definition parameters in filename data in "
+                                 "'Flute_Real_Studio_440.0_C4_B4.wav'");
+    EXPECT_EQ(learnFromRecording("Flute_Real_Studio_440.0_C4_B4_0_0.wav", 0, scaleRecording(60, 12)), 0);
+    EXPECT_EQ(lastMessageText(), "There are too many instrument definition parameters in filename data in "
+                                 "'Flute_Real_Studio_440.0_C4_B4_0_0.wav'");
+    EXPECT_EQ(learnFromRecording("Flute_Real_Studio_440.0_H4_B4_0.wav", 0, scaleRecording(60, 12)), 0);
+    EXPECT_EQ(lastMessageText(), "Cannot interpret pitch in 'H4'");
+    EXPECT_TRUE(instrumentDefinitions.definitions.empty());
+}
+
+TEST_F(InstrumentLearning, The257thDefinitionIsRefused) {
+    fillTable(255);
+    ASSERT_EQ(learnFromRecording("Flute_Real_Studio_440_C4_D4_0.wav", 0, scaleRecording(60, 3)), 1);
+    EXPECT_EQ(instrumentDefinitions.definitions.size(), 256u);
+    EXPECT_EQ(learnFromRecording("Oboe_Real_Studio_440_C4_D4_0.wav", 0, scaleRecording(60, 3)), 0);
+    EXPECT_EQ(lastMessageText(), "There is no more memory available to store new instruments.");
+    EXPECT_EQ(instrumentDefinitions.definitions.size(), 256u);
+}
+
+TEST_F(InstrumentLearning, TablesMadeWithoutRemovingLowAmplitudesAreNotLearnt) {
+    LearningRecording r = scaleRecording(60, 3);
+    r.lowAmplitudesRemoved = 0;
+    EXPECT_EQ(learnFromRecording("Flute_Real_Studio_440_C4_D4_0.wav", 0, r), 0);
+    EXPECT_EQ(lastMessageText(),
+              "Filters have not been applied to 'Flute_Real_Studio_440_C4_D4_0.wav', so it will not be analysed.");
+    EXPECT_TRUE(instrumentDefinitions.definitions.empty());
+}
+
+TEST_F(InstrumentLearning, AReplacementNeedsAMatchingLearntSampleAndExactlyOneNote) {
+    ASSERT_EQ(learnFromRecording("Flute_Real_Studio_440_C4_D4_0.wav", 0, scaleRecording(60, 3)), 1);
+    for (const char* name : {"Flute_Real_Studio_440_C4_1.wav", "Flute_Real_Studio_442_C4_0.wav",
+                             "Flute_Real_Studio_440_E4_0.wav", "Oboe_Real_Studio_440_C4_0.wav"}) {
+        EXPECT_EQ(learnFromRecording(name, 1, scaleRecording(60, 1)), 0) << name;
+        EXPECT_EQ(lastMessageText(),
+                  "A matching pitch could not be found for replacement by '" + std::string(name) + "'.");
+    }
+    EXPECT_EQ(learnFromRecording("Flute_Real_Studio_440_C#4_0.wav", 1, scaleRecording(61, 2)), 0);
+    EXPECT_EQ(lastMessageText(),
+              "Cantoscope did not find exactly one note in the waveform 'Flute_Real_Studio_440_C#4_0.wav'. "
+              "It found 2.");
+    ASSERT_EQ(learnFromRecording("Flute_Real_Studio_440_C#4_0.wav", 1, scaleRecording(61, 1, 90)), 1);
+    EXPECT_EQ(instrumentDefinitions.definitions[0].semitones[1].samples[0].harmonics[0].meanAmplitude, 90u);
+    EXPECT_EQ(instrumentDefinitions.definitions[0].semitones[0].samples[0].harmonics[0].meanAmplitude, 200u);
+}
+
+TEST_F(InstrumentLearning, ANoteStoppedPartWayKeepsItsHarmonicsInTheDefinition) {
+    LearningRecording r = emptyRecording();
+    appendNote(r, 20, {{pitchToFrequency(60), 200, 0, 20}});
+    std::vector<Partial> many;
+    for (int k = 0; k < 40; k++) many.push_back({pitchToFrequency(61) * std::pow(1.1, k), uint8_t(250 - k), 0, 20});
+    appendNote(r, 20, many);
+    ASSERT_EQ(learnFromRecording("Flute_Real_Studio_440_C4_C#4_0.wav", 0, r), 1);
+    EXPECT_EQ(lastMessageText(),
+              "Cannot learn note as found too many harmonics - Increase MAX_CS_HARMONICS definition in Instruments");
+    ASSERT_EQ(loadInstrumentDefinitions(), 1);
+    EXPECT_EQ(instrumentDefinitions.definitions.at(0).semitones[1].samples[0].harmonicCount, 32);
+}
