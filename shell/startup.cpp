@@ -8,6 +8,7 @@
 #include <new>
 #include <unistd.h>
 
+#include "analysis/instrumentDefinitions.h"
 #include "platform/files.h"
 #include "platform/mainloop.h"
 #include "platform/sync.h"
@@ -120,6 +121,9 @@ int startUp(const StartupOptions& options) {
 
     resetSong();
     resetSongNames();
+    // A missing or refused definitions file leaves the table empty; recognition then works
+    // with the default voice.
+    loadInstrumentDefinitions();
     createNamedMutexes();
     emptyUndoFolder();
     deleteWorkingFiles();
@@ -181,6 +185,7 @@ int shutDown(int exitCode) {
     }
 
     closeSong();
+    freeInstrumentDefinitions();
     undoState = UndoState{};
     closeNamedMutexes();
 

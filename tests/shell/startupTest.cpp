@@ -6,6 +6,7 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include "analysis/instrumentDefinitions.h"
 #include "platform/files.h"
 #include "platform/mainloop.h"
 #include "platform/registry.h"
@@ -159,4 +160,12 @@ TEST_F(StartUp, AFailureThatSetsTheQuitFlagSkipsTheLoopButStillShutsDown) {
     EXPECT_FALSE(served);
     EXPECT_EQ(shutDown(0), 0);
     EXPECT_FALSE(fileExists(shared("!InUse")));
+}
+
+TEST_F(StartUp, LoadsTheInstrumentDefinitionsAndFreesThemAtShutDown) {
+    ASSERT_EQ(startUp(options), 1);
+    ASSERT_FALSE(instrumentDefinitions.definitions.empty());
+    EXPECT_EQ(instrumentDefinitions.definitions[0].name, "Voice");
+    shutDown(0);
+    EXPECT_TRUE(instrumentDefinitions.definitions.empty());
 }
