@@ -28,8 +28,9 @@ static void printUsage(FILE* out) {
                  "                 configuration folder (same as MELODRIFT_CONFIG_DIR)\n"
                  "\n"
                  "Commands:\n");
+    // Each command on one line with its arguments, its summary indented below.
     for (const CliCommand& command : cliCommands())
-        std::fprintf(out, "  %-6s %-10s %s\n", command.name, command.usage, command.summary);
+        std::fprintf(out, "  %s %s\n      %s\n", command.name, command.usage, command.summary);
 }
 
 int main(int argc, char** argv) {
