@@ -35,8 +35,11 @@ int claimEvent(int kind, int window, int key, EventCallback callback) {
         showMessage(MESSAGE_ERROR, "Maximum number of claimed events has been reached!");
         return 0;
     }
+    // The id is taken before the slot counts as live, so the slot's old contents are not
+    // mistaken for an entry holding an id.
+    int id = takeNextId();
     ClaimedEvent& entry = appTimers.events[appTimers.count++];
-    entry = ClaimedEvent{kind, window, key, callback, takeNextId()};
+    entry = ClaimedEvent{kind, window, key, callback, id};
     if (kind == EVENT_WINDOW_TIMER)
         startTimer(EVENT_TIMER_ID_BASE + entry.id, EVENT_TIMER_PERIOD_MS,
                    [window, key] { serveTimerEvents(window, key); });

@@ -51,6 +51,7 @@ TEST_F(InstanceLock, AMissingFolderIsAFailureNotAnotherCopy) {
 
 TEST(FreeDiskSpace, ReportsTheSpaceOfARealFolderAndHonoursTheOverride) {
     TempFolder folder;
+    setFreeDiskSpaceOverride(NO_FREE_SPACE_OVERRIDE);
     EXPECT_GT(freeDiskSpace(folder.path()), 0);
     EXPECT_EQ(freeDiskSpace(folder.file("no/such/folder")), -1);
     setFreeDiskSpaceOverride(12345);
