@@ -1,9 +1,9 @@
 #pragma once
-// The options of frequency table creation ("Recognition options", frequency-table part) and
-// the song view's pitch limits that the same step sets. Program globals: the values below
-// are those the program starts with; a new song's analysis replaces some of them from the
-// preferences. Read by the frequency tables, the clean-up filters, note recognition and the
-// song view.
+// The "Recognition options": the frequency-table part, the recognition part with its
+// frequency tolerances, and the song view's pitch limits that the same step sets. Program
+// globals: the values below are those the program starts with; a new song's analysis
+// replaces some of them from the preferences. Read by the frequency tables, the clean-up
+// filters, note recognition and the song view.
 
 #include <cstdint>
 
@@ -33,8 +33,37 @@ struct RecognitionOptions {
     bool groupLimiter = true;                 // the normalisers may change between segments
     bool disableWaveEditing = false;          // "CS Disable wave editing" as taken by the last new song's setup
     bool learningInstruments = false;         // set while instrument definitions are learnt; cleared by opening
+    // recognition part
+    bool analyseScore = true;                 // "Analyse score": whole-song analysis recognises notes
+    bool compand = true;                      // "Compand": whole-song analysis compands the samples first
+    bool mainsHumRemoval = true;              // entries near a steady 50 or 60 Hz family are ignored
+    bool octaveCheck = true;                  // candidates stay within 12 semitones of the recent pitch range
+    bool appendSibilants = true;              // "Append 'SSS' Sounds to Notes"
+    bool octaveJumpCorrection = true;         // short excursions by about an octave are folded back
+    bool flattenVibrato = true;               // "Flatten Vibrato (Alg 2+3)"
+    bool flattenGlissando = true;             // "Flatten Glissando"
+    bool removeLowAmplitudeNotes = true;      // "Remove Low Amplitude Notes"
+    bool fitPhrasesToSemitones = true;        // first further cleaning pass: phrases moved onto the semitone grid
+    bool refineNoteBoundaries = true;         // second further cleaning pass: boundaries where the partials
+                                              // cross, short dropouts bridged
+    bool findSyllables = true;                // "Find Syllables"
+    float lowPitchLimit = 150.0f;             // Hz; below it octave tests allow wider steps
+    bool checkPitchDrop = true;               // "Check &pitch drop and intial noise" (polyphonic note building)
+    bool searchAhead = false;                 // "Search ahead for better matches before coming to a decision"
+    bool allowOverlappingHarmonics = true;    // "Allow overlapping harmonics (repeated notes)"
+    bool allowHarmonicsContainingGaps = false;   // "Allow harmonics containing gaps"
+    bool useLongestHarmonicDuration = true;   // "Use longest harmonic duration to calculate note length ..."
+    bool adjustHarmonicFitDuration = true;    // "Adjust Harmonic Fit Duration ..."
+    float lateHarmonicsPeriod = 0.075f;       // seconds; "Maximum period for late harmonics to begin"
 };
 extern RecognitionOptions recognitionOptions;
+
+// Frequency tolerances of recognition: f and g agree when |f - g| <= g / d.
+constexpr double SEMITONE_TOLERANCE = 17.31715;          // about one semitone
+constexpr double HALF_SEMITONE_TOLERANCE = 34.63431;     // about half a semitone
+constexpr double QUARTER_SEMITONE_TOLERANCE = 69.26862;  // about a quarter semitone
+constexpr double TWO_SEMITONE_TOLERANCE = 8.658577;      // about two semitones
+constexpr double POLYPHONIC_TOLERANCE = 51.95146;        // about a third of a semitone
 
 // The song view's pitch axis limits for the pitch range in force (the view's own unit draws them).
 struct SongViewPitchLimits {

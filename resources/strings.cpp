@@ -11,9 +11,13 @@ static const ResourceStringEntry resourceStrings[] = {
     {10231, "File could not be seeked"},
     {10232, "Bytes were not stored properly"},
     {10271, "Made with Torvellan Melodrift"},
+    {10296, "Waveview display"},
+    {10297, "Analysing wave"},
     {10325, "Message from Torvellan Melodrift"},
+    {10367, "Recording Level"},
     {10401, "Sorry - there is insufficient memory available to continue. Please try freeing up some memory "
             "from other applications."},
+    {10404, "Having problems recording? Click here to adjust settings"},
 };
 
 std::string resourceString(int id) {

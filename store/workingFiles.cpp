@@ -4,6 +4,7 @@
 
 #include <mutex>
 
+#include "analysis/noteRecognition.h"
 #include "notes/noteList.h"
 #include "notes/selection.h"
 #include "platform/sync.h"
@@ -51,6 +52,7 @@ int closeSong() {
     freeHiresBuffers();
     resetSong();
     resetNoteList();
+    resetNoteRecognition();   // the next song settles its own instruments and voice
     if (!emptyUndoFolder()) closed = 0;
     if (!deleteWorkingFiles()) closed = 0;
     resetSelection();

@@ -1,0 +1,48 @@
+#pragma once
+// Note building: the decided pitch track cut into Note records. Runs of blocks on one semitone
+// are note candidates; each is matched against the instrument definitions, kept when its
+// duration suits the instrument's voice, given its pitch (notePitch) and appended to the note
+// list, and split at syllable starts. The song's instrument list (at most 16) records the
+// instruments the notes use. buildNotes (noteRecognition.h) is the entry point.
+
+#include <cstdint>
+
+constexpr int MAX_SONG_INSTRUMENTS = 16;
+// A note's duration limits come from its instrument's General MIDI voice (counted from 0).
+constexpr int VOICE_OOHS_VOICE = 53;   // the voice when no instrument definition is loaded
+// A block keeps the semitone the block before held while its pitch stays within half a
+// semitone and this much of it.
+constexpr double SEMITONE_HYSTERESIS = 0.3;
+// A note starts where its partial began to rise, at most this much before the pitch track
+// takes it, seconds.
+constexpr double ONSET_ADVANCE_SECONDS = 0.08;
+
+struct SongInstruments {
+    int definitions[MAX_SONG_INSTRUMENTS];   // InstrumentDefinition index of each slot (-1: the built-in voice)
+    int noteCounts[MAX_SONG_INSTRUMENTS];    // notes built with each slot
+    double strengths[MAX_SONG_INSTRUMENTS];  // their summed strength
+    int count;                               // slots in use
+    int settledVoice;                        // the song's MIDI voice once two instruments were in use; -1 before
+};
+extern SongInstruments songInstruments;
+
+// Empties the list (song close, a new whole-song analysis).
+void resetSongInstruments();
+
+// recognitionCode bits of a recognised note.
+constexpr uint32_t NOTE_MATCHED_IN_RANGE = 1;      // an instrument definition's range and sample fit it
+constexpr uint32_t NOTE_OUTSIDE_DEFINITIONS = 2;   // none fitted; it took the song's instrument
+constexpr uint32_t NOTE_SPLIT_AT_SYLLABLE = 4;     // it starts or ends at a syllable start
+
+// The shortest note of voice at pitch (MIDI number): 0.05 s for the choir, voice and whistle
+// programs (52, 53, 78); otherwise 0.25 s at 24 and below to 1/12 s at 60 and above, linear.
+double shortestNoteSeconds(int voice, double pitch);
+// The longest sustain: pianos (0..5) 10 s at 24 and below to 5 s at 68 and above; guitars and
+// basses (24..39) 5 s to 3 s over the same pitches; every other voice 1000 s.
+double longestSustainSeconds(int voice, double pitch);
+
+// The pitch (Hz) of the note on blocks [first, end): the blocks' detected frequencies,
+// flattened, averaged in semitones within a semitone of their mean, leaving out the first
+// min(0.1 s, a quarter of the note); the blocks' dataBuffers are put back afterwards. mean, when
+// above 0, replaces the mean found (A = 440 Hz throughout). 440.0 for a note without a pitch.
+double notePitch(uint32_t first, uint32_t end, double mean = 0.0);

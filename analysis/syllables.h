@@ -1,0 +1,55 @@
+#pragma once
+// Syllable starts: where a sung line re-articulates, found from the magnitude spectrogram and
+// marked in the blocks' flags (BLOCK_SYLLABLE_START), so that the cleaning passes end runs there
+// and note building splits notes there. The recognition pass calls findSyllables; the
+// syllable list of the last pass is kept until the next one or until released.
+
+#include <cstdint>
+#include <vector>
+
+// Syllable cues of the spectrogram rows.
+constexpr double SYLLABLE_SPLIT_LIMIT_HZ = 3000.0;      // the brightness split: twice the fundamental, at most this
+constexpr double SYLLABLE_BRIGHT_PITCH_HZ = 524.0;      // fundamentals above it scale the ratio down
+constexpr double SYLLABLE_ESTIMATE_SECONDS = 0.02;      // the fundamental estimate is refreshed at most this often
+constexpr double SYLLABLE_DEFAULT_PITCH_HZ = 200.0;     // estimate before any pitch is known
+constexpr float SYLLABLE_SPIKE_THRESHOLD = 0.6666667f;  // the robust maximum of the row totals
+// Energy dips: a valley of the row totals (smoothed over three rows) whose loudness on both
+// sides, within DIP_REACH_SECONDS, is at least DIP_DEPTH times the valley and at least
+// DIP_MIN_LEVEL of the robust maximum starts a syllable at the valley.
+constexpr double DIP_REACH_SECONDS = 0.15;
+constexpr double DIP_DEPTH = 3.0;
+constexpr double DIP_MIN_LEVEL = 0.1;
+// Consonants ("CS Detect syllables"): a peak of the brightness ratio of at least 0.3, reached
+// from a ratio 0.1 lower within 0.2 s before it (or 0.07 lower after a stretch flat to within
+// 0.01 for 0.03 s) and falling away the same way after it, starts a syllable where the ratio
+// has fallen back.
+constexpr double CONSONANT_MIN_RATIO = 0.3;
+constexpr double CONSONANT_RISE = 0.1;
+constexpr double CONSONANT_FLAT_RISE = 0.07;
+constexpr double CONSONANT_FLAT_CHANGE = 0.01;
+constexpr double CONSONANT_FLAT_SECONDS = 0.03;
+constexpr double CONSONANT_REACH_SECONDS = 0.2;
+// ... and whose row is at most CONSONANT_QUIETER of the loudest row within
+// CONSONANT_LOUDNESS_SECONDS of it.
+constexpr double CONSONANT_QUIETER = 0.5;
+constexpr double CONSONANT_LOUDNESS_SECONDS = 0.1;
+// Two syllable starts are at least this far apart; the earlier one stands.
+constexpr double SYLLABLE_MIN_SPACING_SECONDS = 0.1;
+
+struct Syllables {
+    std::vector<uint32_t> startBlocks;   // blocks where the last pass found a syllable start, ascending
+};
+extern Syllables syllables;
+
+// Clears BLOCK_SYLLABLE_START over the blocks of [from, end) the spectrogram covers (in the
+// dataBuffers and the origDataBuffers), finds the syllable starts there and sets the bit on
+// their blocks. Blocks the spectrogram no longer covers keep the starts found before.
+void findSyllables(uint32_t from, uint32_t end);
+// Forgets the syllable list.
+void releaseSyllables();
+
+// The brightness ratio of one row: the magnitude above the split (twice fundamental, at most
+// SYLLABLE_SPLIT_LIMIT_HZ) over the magnitude below it, or the magnitude above alone when
+// nothing lies below, divided by fundamental / 524 when fundamental is 524 Hz or more. The
+// first three magnitudes are left out; magnitude i lies at (i + 1) x binWidth Hz.
+double brightnessRatio(const uint32_t* magnitudes, uint32_t count, double binWidth, double fundamental);

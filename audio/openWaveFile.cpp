@@ -1,0 +1,240 @@
+// Opening a wave file: the checks and the set-up on the main thread, the hand-over to the
+// worker and the end of an opening, and the level meter's values.
+#include "audio/openWaveFile.h"
+
+#include <algorithm>
+#include <chrono>
+#include <cmath>
+#include <filesystem>
+#include <thread>
+
+#include "analysis/analysisSampleBuffer.h"
+#include "analysis/frequencyAnalysis.h"
+#include "analysis/recognitionOptions.h"
+#include "audio/audioActivity.h"
+#include "audio/openWaveWorker.h"
+#include "audio/waveWorkingFile.h"
+#include "platform/clock.h"
+#include "platform/files.h"
+#include "platform/mainloop.h"
+#include "platform/ui.h"
+#include "shell/mainFrame.h"
+#include "shell/paths.h"
+#include "shell/saveSong.h"
+#include "shell/settings.h"
+#include "shell/startup.h"
+#include "store/ftBlockStore.h"
+#include "store/hiresFTBlockStore.h"
+#include "store/song.h"
+#include "store/undo.h"
+
+OpeningState openingState;
+LevelMeter levelMeter;
+
+// The source format while no file is open.
+static const WaveFormatRecord DEFAULT_SOURCE_FORMAT = {WAVE_FORMAT_PCM, 1, 44100, 88200, 2, 16, 0};
+
+// Reference levels of the meter: the rms that fills it, for 8- and 16-bit samples.
+static const double METER_REFERENCE_8_BIT = 89.789;
+static const double METER_REFERENCE_16_BIT = 23166.269;
+
+// Undo snapshots arrive with the undo store; until then an opening takes none, and this
+// stands where the snapshot is taken.
+static void takeUndoSnapshotNotYetBuilt() {}
+
+static void releaseChunkBuffer() {
+    OpeningState& o = openingState;
+    std::vector<uint8_t>().swap(o.chunkBuffer);
+    o.bufferBytes = 0;
+    o.bufferSamples = 0;
+    o.bufferFirstSample = 0;
+}
+
+// The song's length in samples, as its blocks place them.
+static uint32_t songSamples() {
+    return uint32_t(std::trunc(songDuration() * song.waveFormat.samplesPerSec + 0.5));
+}
+
+static std::string fullPath(const std::string& path) {
+    std::error_code error;
+    std::filesystem::path full = std::filesystem::absolute(path, error);
+    return error ? path : full.string();
+}
+
+// Brings CS.fw back to rest after a set-up step failed.
+static void maskWorkingFileAgain() {
+    waitForUndoSnapshotWriter();
+    std::lock_guard<std::mutex> access(CSAccessWaveFileMutex);
+    maskWaveWorkingFile();
+}
+
+int openWaveFile(const std::string& path) {
+    OpeningState& o = openingState;
+    // The refusal comes before the preferences: while a worker fills the song, the song's
+    // block count is the worker's to change, and no preferences can apply to this opening.
+    if (refuseWhileBusy()) return 1;
+    if (song.blockCount == 0 && generalSettings.quickPrefs && o.quickPreferences && !o.quickPreferences()) return 0;
+    int64_t freeBytes = freeDiskSpace(paths.sharedFolder);
+    if (freeBytes < 0) freeBytes = DISK_SPACE_UNKNOWN;
+    if (freeBytes < OPENING_DISK_SPACE_MINIMUM) {
+        showMessage(MESSAGE_ERROR, OPENING_DISK_LOW_TEXT);
+        return 1;
+    }
+    releaseChunkBuffer();
+    o.sourceFormat = DEFAULT_SOURCE_FORMAT;
+
+    WaveReadInfo info{};
+    uint32_t code = wioFileOpen(&info, path, 0);
+    if (code != WIO_OPENED) {
+        showMessage(MESSAGE_ERROR, waveOpenMessage(code));
+        return 1;
+    }
+    struct CloseReader {
+        WaveReadInfo* info;
+        ~CloseReader() { wioFileClose(info); }
+    } closeReader{&info};
+    const WaveFormatRecord& format = *info.format;
+    if (format.samplesPerSec > HIGHEST_OPENING_RATE) {
+        showMessage(MESSAGE_ERROR, RATE_TOO_HIGH_TEXT);
+        return 1;
+    }
+    o.sourceFormat = format;
+    o.sourceDuration = format.samplesPerSec ? float(double(info.dataSamples) / format.samplesPerSec) : 0.0f;
+    if (format.channels > MAX_WAVE_CHANNELS) {
+        showMessage(MESSAGE_ERROR, TOO_MANY_CHANNELS_TEXT);
+        return 1;
+    }
+    // The reader lets through compressed or float data that carries a fact chunk, and PCM of
+    // other sizes than 8 and 16 bits; read as 8- or 16-bit PCM they would become noise in the
+    // song and its analysis, so they get the unsupported-format message here.
+    if (checkWaveFileFormat(info) != WIO_OPENED) {
+        showMessage(MESSAGE_ERROR, waveOpenMessage(WIO_NOT_PCM));
+        return 1;
+    }
+    if (!acceptWaveFormat(format)) {
+        showMessage(MESSAGE_ERROR, CANNOT_APPEND_TEXT);
+        return 1;
+    }
+    wioFileClose(&info);
+
+    // The set-up below is the processing of this opening until the worker takes it over.
+    std::unique_lock<std::mutex> processing(CSWaveProcessingMutex);
+    bool appending = song.blockCount > 0;
+    recognitionOptions.learningInstruments = false;
+    releaseFrequencyAnalysis();
+    clearAnalysisSampleBuffer();   // no buffer in view: a chunk is one group of blocks
+    o.startTime = timeCounter();
+    o.samplesBefore = songSamples();
+    if (!setupFrequencyAnalysis()) return 1;
+
+    // Every later failure leaves the song as it was: no analysis, no open FT files, CS.fw at rest.
+    struct Unwind {
+        bool armed = true;
+        ~Unwind() {
+            if (!armed) return;
+            releaseFrequencyAnalysis();
+            if (ftFilesOpen()) closeFTFile(1);
+            closeHiresFTFile(1);
+            maskWorkingFileAgain();
+        }
+    } unwind;
+    if (appending) {
+        waitForUndoSnapshotWriter();
+        std::lock_guard<std::mutex> access(CSAccessWaveFileMutex);
+        // Nothing could be appended to a working file that cannot be brought back to plain.
+        if (!unmaskWaveWorkingFile()) {
+            showMessage(MESSAGE_ERROR, "Cannot " + sharedFilePath("CS.fw"));
+            return 1;
+        }
+    } else if (createWaveWorkingFile() != 0) {
+        return 1;
+    }
+    if (!openFTFile(FT_UPDATE) || !openHiresFTFile(FT_UPDATE)) return 1;
+    unwind.armed = false;
+
+    showSongView();
+    o.samplesDone = o.samplesBefore;
+    o.storedSamples = o.samplesBefore;
+    o.samplesRead = 0;
+    o.sourceBytesRead = 0;
+    o.endOfSource = -1;
+    o.recognitionShare = globalSettings.boostSpeed ? 0.1 : 0.2;
+    o.displayShare = globalSettings.boostSpeed ? 0.05 : 0.1;
+    resetOpeningProgress();
+    openingProgress.notesPosition = 0;
+    openingProgress.recognisedTo = o.samplesBefore;
+    openingProgress.blocksWrittenBack = song.blockCount;
+    openingProgress.hiresBlocksStored = song.blockCount;
+
+    o.sourcePath = fullPath(path);
+    processing.unlock();
+    audioActivity.opening = true;
+    takeUndoSnapshotNotYetBuilt();
+    startWorker(o.worker, CSOpenWaveFileDataThread);
+    if (!appending) setSongNamesFromFile(path);
+    return 1;
+}
+
+void requestOpeningStop() {
+    if (openingState.worker.thread.joinable()) requestWorkerStop(openingState.worker);
+}
+
+void openingEnded() {
+    joinWorker(openingState.worker);
+    audioActivity.opening = false;
+    redrawSongView();
+    updateFrameDisplay();   // the status bar no longer says the song is being opened
+}
+
+void waitForOpeningToEnd() {
+    // The flag stays set until openingEnded runs here, so the worker's last call is served too.
+    while (audioActivity.opening && openingState.worker.thread.joinable()) {
+        if (serveMainLoopOnce() == 0) std::this_thread::sleep_for(std::chrono::milliseconds(1));
+    }
+}
+
+void resetOpeningState() {
+    OpeningState& o = openingState;
+    requestWorkerStop(o.worker);
+    joinWorker(o.worker);
+    audioActivity.opening = false;
+    releaseChunkBuffer();
+    o.sourcePath.clear();
+    o.sourceFormat = DEFAULT_SOURCE_FORMAT;
+    o.sourceDuration = 0;
+    o.samplesBefore = 0;
+    o.samplesDone = 0;
+    o.samplesRead = 0;
+    o.sourceBytesRead = 0;
+    o.storedSamples = 0;
+    o.endOfSource = -1;
+    o.recognitionShare = 0.2;
+    o.displayShare = 0.1;
+    o.startTime = 0;
+    resetOpeningProgress();
+    std::lock_guard<std::mutex> guard(levelMeter.lock);
+    std::fill(std::begin(levelMeter.levels), std::end(levelMeter.levels), 0);
+}
+
+int levelMeterValue(const uint8_t* samples, uint32_t count, int bitsPerSample) {
+    if (count == 0) return 0;
+    double sum = 0;
+    for (uint32_t i = 0; i < count; i++) {
+        double x;
+        if (bitsPerSample == 16) x = double(int16_t(uint16_t(samples[2 * i] | samples[2 * i + 1] << 8)));
+        else x = double(samples[i]) - 128.0;
+        sum += x * x;
+    }
+    double rms = std::sqrt(sum / count);
+    double r = bitsPerSample == 16 ? METER_REFERENCE_16_BIT : METER_REFERENCE_8_BIT;
+    double value = LEVEL_METER_FULL_SCALE * std::log10(std::max(0.0, rms - r / 32) + 1) /
+                   std::log10(std::max(0.0, r - r / 32) + 1);
+    // Above the reference the rule gives more than the meter can draw.
+    return std::min(int(value), LEVEL_METER_FULL_SCALE);
+}
+
+void pushLevelMeterValue(int value) {
+    std::lock_guard<std::mutex> guard(levelMeter.lock);
+    std::copy(levelMeter.levels + 1, levelMeter.levels + LEVEL_METER_BARS, levelMeter.levels);
+    levelMeter.levels[LEVEL_METER_BARS - 1] = value;
+}

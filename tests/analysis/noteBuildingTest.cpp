@@ -1,0 +1,206 @@
+// Note building from a decided pitch track: the notes' times, pitches, semitones and volumes,
+// the voice-dependent duration limits, the syllable splits, the dropped notes, a full list, the
+// instrument match, and the note pitch.
+#include <gtest/gtest.h>
+
+#include "analysis/recognitionFixtures.h"
+
+class NoteBuilding : public RecognitionTest {
+protected:
+    double blockTime(uint32_t b) const { return b * song.sampleBlockDuration; }
+    // A definition of one sine harmonic per semitone, as the program generates for most names.
+    static InstrumentDefinition sineDefinition(const char* name, int voice, int low, int high) {
+        InstrumentDefinition d{name, "Sine", "Generated", uint8_t(voice), 1, {70.0f, 30.0f, 10.0f}, 440.0f,
+                               uint8_t(low), uint8_t(high), {}};
+        for (int s = low; s <= high; s++) {
+            NoteSampleSet set{};
+            set.sampleCount = 1;
+            set.samples[0].duration = 1.0f;
+            set.samples[0].level = 200;
+            set.samples[0].harmonicCount = 1;
+            set.samples[0].harmonics[0].frequency = float(pitchToFrequency(s));
+            set.samples[0].harmonics[0].meanAmplitude = 200;
+            d.semitones.push_back(set);
+        }
+        return d;
+    }
+};
+
+TEST_F(NoteBuilding, RunsOnOneSemitoneBecomeNotesInTimeOrder) {
+    makeSong(90);
+    setPitches(10, 40, 220.0, 100);
+    setPitches(50, 90, 329.63, 150);
+    uint32_t next = buildNotes(0, 0);
+    EXPECT_EQ(next, 90u * 512u) << "the end of the blocks worked on";
+    ASSERT_EQ(noteList.count, 2);
+    const Note& a = noteList.notes[0];
+    const Note& b = noteList.notes[1];
+    EXPECT_NEAR(a.waveStart, blockTime(10), 1e-6);
+    EXPECT_NEAR(a.waveEnd, blockTime(40), 1e-6);
+    EXPECT_EQ(a.midiStart, a.waveStart);
+    EXPECT_EQ(a.midiEnd, a.waveEnd);
+    EXPECT_NEAR(a.pitch, 220.0, 0.01);
+    EXPECT_EQ(a.midiNote, 57);
+    EXPECT_EQ(a.volumeSum, 30u * 100u);
+    EXPECT_EQ(a.recognitionWeight, 100.0f);
+    EXPECT_EQ(b.midiNote, 64);
+    EXPECT_NEAR(b.waveStart, blockTime(50), 1e-6);
+    EXPECT_EQ(b.volumeSum, 40u * 150u);
+}
+
+TEST_F(NoteBuilding, ANoteTwentyCentsSharpKeepsItsSemitone) {
+    makeSong(60);
+    setPitches(10, 50, 440.0 * std::exp2(0.2 / 12.0));
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 1);
+    EXPECT_EQ(noteList.notes[0].midiNote, 69);
+}
+
+TEST_F(NoteBuilding, ANoteWaveringAcrossASemitoneBoundaryStaysOneNote) {
+    makeSong(80);
+    for (uint32_t b = 10; b < 70; b++) setPitch(b, pitchToFrequency(b % 2 ? 60.45 : 60.6));
+    buildNotes(0, 0);
+    EXPECT_EQ(noteList.count, 1);
+}
+
+TEST_F(NoteBuilding, AVoiceNoteShorterThanFiveHundredthsOfASecondIsDropped) {
+    makeSong(60);
+    setPitches(10, 14, 220.0);   // 0.046 s
+    setPitches(30, 35, 220.0);   // 0.058 s
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 1);
+    EXPECT_NEAR(noteList.notes[0].waveStart, blockTime(30), 1e-6);
+}
+
+TEST_F(NoteBuilding, ASliverBetweenTwoRunsOfOneSemitoneJoinsThem) {
+    makeSong(80);
+    setPitches(10, 70, 220.0);
+    setPitches(40, 42, 440.0);
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 1);
+    EXPECT_NEAR(noteList.notes[0].pitch, 220.0, 0.01) << "the sliver does not pull the pitch";
+}
+
+TEST_F(NoteBuilding, ANoteSplitsAtASyllableStartWellInsideIt) {
+    makeSong(120);
+    setPitches(0, 100, 220.0, 100);
+    blockData(50).blockFlags |= BLOCK_SYLLABLE_START;
+    blockData(5).blockFlags |= BLOCK_SYLLABLE_START;    // 0.058 s from the start: too close
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 2);
+    EXPECT_NEAR(noteList.notes[0].waveEnd, blockTime(50), 1e-6);
+    EXPECT_NEAR(noteList.notes[1].waveStart, blockTime(50), 1e-6);
+    EXPECT_NEAR(noteList.notes[1].waveEnd, blockTime(100), 1e-6);
+    EXPECT_EQ(noteList.notes[0].volumeSum, 5000u);
+    EXPECT_EQ(noteList.notes[1].volumeSum, 5000u);
+    EXPECT_TRUE(noteList.notes[0].recognitionCode & NOTE_SPLIT_AT_SYLLABLE);
+}
+
+TEST_F(NoteBuilding, WithoutFindSyllablesNothingSplits) {
+    makeSong(120);
+    recognitionOptions.findSyllables = false;
+    setPitches(0, 100, 220.0);
+    blockData(50).blockFlags |= BLOCK_SYLLABLE_START;
+    buildNotes(0, 0);
+    EXPECT_EQ(noteList.count, 1);
+}
+
+TEST_F(NoteBuilding, TheNotesToDropAreRemovedBeforeTheNewOnesAreAppended) {
+    makeSong(120);
+    setPitches(10, 40, 220.0);
+    setPitches(50, 80, 330.0);
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 2);
+    setPitches(50, 80, 0.0);
+    setPitches(60, 110, 392.0);
+    buildNotes(sampleOf(45), 1);
+    ASSERT_EQ(noteList.count, 2);
+    EXPECT_EQ(noteList.notes[0].midiNote, 57);
+    EXPECT_EQ(noteList.notes[1].midiNote, 67);
+}
+
+TEST_F(NoteBuilding, AFullNoteListTakesNoMoreNotes) {
+    makeSong(120);
+    setPitches(10, 40, 220.0);
+    setPitches(50, 80, 330.0);
+    Note early{};
+    early.waveEnd = early.midiEnd = 0.01f;
+    while (noteList.count < MAX_CS_NOTES - 1) ASSERT_EQ(appendNote(early), 1);
+    buildNotes(0, 0);
+    EXPECT_EQ(noteList.count, MAX_CS_NOTES);
+    EXPECT_EQ(noteList.notes[MAX_CS_NOTES - 1].midiNote, 57);
+}
+
+TEST_F(NoteBuilding, WithoutDefinitionsANoteIsTheBuiltInVoice) {
+    makeSong(60);
+    setPitches(10, 50, 220.0);
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 1);
+    EXPECT_EQ(noteList.notes[0].instrument, 0);
+    EXPECT_EQ(noteList.notes[0].group, VOICE_OOHS_VOICE);
+    EXPECT_EQ(noteList.notes[0].recognitionCode & NOTE_OUTSIDE_DEFINITIONS, NOTE_OUTSIDE_DEFINITIONS);
+}
+
+TEST_F(NoteBuilding, TheSongsInstrumentIsSettledByItsNotesAndHoldsEveryNote) {
+    instrumentDefinitions.definitions.push_back(sineDefinition("Flute", 73, 60, 96));
+    instrumentDefinitions.definitions.push_back(sineDefinition("Voice", 53, 36, 84));
+    makeSong(200);
+    setPitches(10, 40, 220.0);
+    setPitches(50, 80, 246.94);
+    setPitches(90, 120, 261.63);
+    setPitches(130, 160, 1567.98);   // note 91: only the flute reaches it
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 4);
+    EXPECT_EQ(songInstruments.settledVoice, 53);
+    for (int i = 0; i < 4; i++) {
+        EXPECT_EQ(noteList.notes[i].instrument, 1) << "note " << i;
+        EXPECT_EQ(noteList.notes[i].group, 53);
+        EXPECT_EQ(noteList.notes[i].sourceIndex, 0u);
+    }
+    EXPECT_EQ(noteList.notes[0].recognitionCode & NOTE_MATCHED_IN_RANGE, NOTE_MATCHED_IN_RANGE);
+    EXPECT_EQ(noteList.notes[3].recognitionCode & NOTE_OUTSIDE_DEFINITIONS, NOTE_OUTSIDE_DEFINITIONS);
+    EXPECT_EQ(noteList.notes[3].midiNote, 91);
+}
+
+TEST_F(NoteBuilding, NotePitchLeavesOutTheStartAndWhatLiesASemitoneAway) {
+    makeSong(60);
+    setPitches(0, 8, 392.0);
+    setPitches(8, 50, 440.0);
+    setPitches(30, 32, 880.0);
+    FTDataBuffer before = blockData(31);
+    EXPECT_NEAR(notePitch(0, 50), 440.0, 0.01);
+    EXPECT_NEAR(blockData(31).entries[0].frequency, before.entries[0].frequency, 1e-6) << "the blocks are put back";
+    EXPECT_EQ(blockData(31).nEntries, before.nEntries);
+    EXPECT_NEAR(notePitch(0, 50, 392.0), 392.0, 0.01) << "a given mean starts the count";
+}
+
+class NoteBuildingDurations : public ::testing::Test {};
+
+TEST_F(NoteBuildingDurations, ShortestNoteByVoiceAndPitch) {
+    EXPECT_DOUBLE_EQ(shortestNoteSeconds(53, 30.0), 0.05);
+    EXPECT_DOUBLE_EQ(shortestNoteSeconds(52, 90.0), 0.05);
+    EXPECT_DOUBLE_EQ(shortestNoteSeconds(78, 10.0), 0.05);
+    EXPECT_DOUBLE_EQ(shortestNoteSeconds(0, 24.0), 0.25);
+    EXPECT_DOUBLE_EQ(shortestNoteSeconds(40, 60.0), 1.0 / 12.0);
+    EXPECT_NEAR(shortestNoteSeconds(40, 42.0), 1.0 / 6.0, 1e-12);
+    EXPECT_DOUBLE_EQ(shortestNoteSeconds(40, 100.0), 1.0 / 12.0);
+}
+
+TEST_F(NoteBuildingDurations, LongestSustainByVoiceAndPitch) {
+    EXPECT_DOUBLE_EQ(longestSustainSeconds(0, 20.0), 10.0);
+    EXPECT_DOUBLE_EQ(longestSustainSeconds(5, 46.0), 7.5);
+    EXPECT_DOUBLE_EQ(longestSustainSeconds(3, 80.0), 5.0);
+    EXPECT_DOUBLE_EQ(longestSustainSeconds(24, 24.0), 5.0);
+    EXPECT_DOUBLE_EQ(longestSustainSeconds(39, 68.0), 3.0);
+    EXPECT_DOUBLE_EQ(longestSustainSeconds(6, 24.0), 1000.0);
+    EXPECT_DOUBLE_EQ(longestSustainSeconds(53, 60.0), 1000.0);
+}
+
+TEST_F(NoteBuilding, APianoNoteLongerThanItsSustainIsNoNote) {
+    instrumentDefinitions.definitions.push_back(sineDefinition("Piano", 0, 21, 108));
+    globalSettings.defaultInstrument = "Piano";
+    makeSong(900);
+    setPitches(0, 900, 880.0);   // 10.4 s at note 81: a piano sustains 5 s
+    buildNotes(0, 0);
+    EXPECT_EQ(noteList.count, 0);
+}

@@ -1,0 +1,141 @@
+// The per-block pitch decision: which entry is the fundamental, how its band grows, what the
+// merged entry holds, the dropout stand-ins, the octave check and the detected frequencies.
+#include <gtest/gtest.h>
+
+#include "analysis/pitchDecision.h"
+#include "analysis/recognitionFixtures.h"
+
+class PitchDecision : public RecognitionTest {
+protected:
+    void decide(uint32_t from, uint32_t to, uint32_t end) {
+        RecognitionPass pass{from, to, end, {}};
+        decideBlockPitches(pass);
+    }
+};
+
+TEST_F(PitchDecision, MergedPitchIsTheAmplitudeWeightedMeanOfTheBand) {
+    makeSong(60);
+    setBlocks(0, 60, {{260.0, 100}, {270.0, 80}}, 20);
+    decide(0, 0, 60);
+    const FTDataBuffer& data = blockData(30);
+    ASSERT_EQ(data.nEntries, 1u);
+    EXPECT_NEAR(data.entries[0].frequency, 264.3979, 1e-3);
+    EXPECT_NEAR(data.entries[0].frequencyWidth, 25.3027, 1e-3) << "band 252.49 .. 277.80 Hz";
+    EXPECT_EQ(data.entries[0].amplitude, 100) << "(100 + 80 + loudness 20) / 2";
+    EXPECT_EQ(data.entries[0].initialAmplitude, 100);
+    EXPECT_EQ(data.entries[0].cutOffLevel, TEST_CUT_OFF);
+}
+
+TEST_F(PitchDecision, AnEntryOutsideTheBandAddsToTheAmplitudeButNotToThePitch) {
+    makeSong(60);
+    setBlocks(0, 60, {{260.0, 100}, {300.0, 90}}, 0);
+    decide(0, 0, 60);
+    EXPECT_NEAR(blockPitch(30), 260.0, 1e-3);
+    EXPECT_EQ(blockData(30).entries[0].amplitude, 95);
+}
+
+TEST_F(PitchDecision, AmplitudeIsCappedAt255) {
+    makeSong(60);
+    setBlocks(0, 60, {{260.0, 255}, {270.0, 255}}, 255);
+    decide(0, 0, 60);
+    EXPECT_EQ(blockData(30).entries[0].amplitude, 255);
+}
+
+TEST_F(PitchDecision, TheFundamentalOfALowVoiceWinsOverItsStrongerSecondHarmonic) {
+    makeSong(60);
+    setBlocks(0, 60, {{103.8, 12}, {207.7, 120}, {311.5, 14}, {415.3, 8}}, 150);
+    decide(0, 0, 60);
+    EXPECT_NEAR(cents(blockPitch(30), 103.8), 0.0, 50.0);
+}
+
+TEST_F(PitchDecision, AWeakFundamentalThatHoldsOnUnderAStrongOctaveIsTheNote) {
+    makeSong(60);
+    setBlocks(0, 60, {{230.0, 4}, {460.0, 200}}, 150);
+    decide(0, 0, 60);
+    EXPECT_NEAR(cents(blockPitch(30), 230.0), 0.0, 50.0);
+}
+
+TEST_F(PitchDecision, AStrayEntryAnOctaveBelowDoesNotTakeTheNote) {
+    makeSong(60);
+    for (uint32_t b = 0; b < 60; b++)
+        setBlock(b, b % 3 == 0 ? std::vector<TestEntry>{{220.0, 3}, {440.0, 200}} : std::vector<TestEntry>{{440.0, 200}}, 150);
+    decide(0, 0, 60);
+    EXPECT_NEAR(blockPitch(30), 440.0, 0.01);
+}
+
+TEST_F(PitchDecision, ADropoutKeepsTheLastPitchAtAmplitudeZeroFor006Seconds) {
+    makeSong(60);
+    setBlocks(0, 40, {{220.0, 150}}, 100);
+    decide(0, 0, 60);
+    for (uint32_t b = 40; b < 45; b++) {
+        ASSERT_EQ(blockData(b).nEntries, 1u) << "block " << b;
+        EXPECT_NEAR(blockData(b).entries[0].frequency, 220.0, 0.01);
+        EXPECT_EQ(blockData(b).entries[0].amplitude, 0);
+        EXPECT_EQ(blockPitch(b), 0.0);
+    }
+    EXPECT_EQ(blockData(45).nEntries, 0u) << "five blocks are 0.058 s; the sixth is past 0.06 s";
+}
+
+TEST_F(PitchDecision, ABlockDecidedBeforeIsLeftAsItIs) {
+    makeSong(60);
+    setBlocks(0, 60, {{260.0, 100}, {270.0, 80}}, 20);
+    setPitches(0, 30, 300.0, 77);
+    decide(0, 30, 60);
+    EXPECT_NEAR(blockPitch(10), 300.0, 1e-3);
+    EXPECT_EQ(blockData(10).entries[0].amplitude, 77);
+    EXPECT_NEAR(blockPitch(40), 264.3979, 1e-3);
+}
+
+TEST_F(PitchDecision, TheOctaveCheckKeepsANoteAwayFromARumbleTwoOctavesBelowTheRecentPitches) {
+    makeSong(200);
+    setBlocks(0, 200, {{55.0, 200}, {220.0, 150}}, 150);
+    setPitches(0, 100, 220.0);
+    decide(0, 100, 200);
+    EXPECT_NEAR(blockPitch(150), 220.0, 0.01);
+}
+
+TEST_F(PitchDecision, AMelodyLeapingPastTheRangeStillGetsItsPitch) {
+    makeSong(200);
+    setBlocks(100, 200, {{55.0, 200}}, 150);
+    setPitches(0, 100, 220.0);
+    decide(0, 100, 200);
+    EXPECT_NEAR(blockPitch(150), 55.0, 0.01);
+}
+
+TEST_F(PitchDecision, WithoutTheOctaveCheckTheLowestStrongEntryWins) {
+    makeSong(200);
+    recognitionOptions.octaveCheck = false;
+    setBlocks(0, 200, {{55.0, 200}, {220.0, 150}}, 150);
+    setPitches(0, 100, 220.0);
+    decide(0, 100, 200);
+    EXPECT_NEAR(blockPitch(150), 55.0, 0.01);
+}
+
+// ---- the detected frequencies, through the whole pass ----
+
+class RecognitionDetected : public PitchDecision {};
+
+TEST_F(RecognitionDetected, ABlockWithNoEntriesKeepsTheLastDetectedFrequency) {
+    makeSong(120);
+    setBlocks(0, 40, {{220.0, 150}}, 100);
+    recognisePitchTrack(0, 0);
+    const FTDetectedBuffer& held = blockDetected(39);
+    const FTDetectedBuffer& empty = blockDetected(80);
+    ASSERT_EQ(blockData(80).nEntries, 0u);
+    ASSERT_EQ(empty.nEntries, 1u);
+    EXPECT_NEAR(empty.entries[0].frequency, 220.0, 0.5);
+    EXPECT_EQ(empty.entries[0].frequency, held.entries[0].frequency);
+    EXPECT_EQ(empty.entries[0].amplitude, held.entries[0].amplitude);
+    EXPECT_GT(empty.entries[0].amplitude, 0);
+}
+
+TEST_F(RecognitionDetected, ThePitchSpreadIsTheWidthInSemitones) {
+    makeSong(60);
+    setBlocks(0, 60, {{260.0, 100}, {270.0, 80}}, 20);
+    recognisePitchTrack(0, 0);
+    const FrequencyEntry& d = blockDetected(30).entries[0];
+    const FrequencyEntry& e = blockData(30).entries[0];
+    // The band 252.49 .. 277.80 Hz around 264.40 Hz spans 1.66 semitones.
+    EXPECT_NEAR(d.frequencyWidth, 1.657, 0.01);
+    EXPECT_EQ(d.amplitude, e.amplitude);
+}

@@ -1,0 +1,100 @@
+// Syllable starts from the spectrogram: loudness dips between two loud stretches, consonants
+// (a brightening that interrupts the voice) only with "CS Detect syllables", the brightness
+// ratio, and the blocks and flags they are marked on.
+#include <gtest/gtest.h>
+
+#include "analysis/recognitionFixtures.h"
+
+class SyllableStarts : public RecognitionTest {
+protected:
+    static constexpr uint32_t BLOCKS = 200;   // 400 rows of 256 samples
+    // A voiced row: its fundamental at 200 Hz carries level; brightness above 400 Hz adds bright.
+    void voicedRow(uint32_t* row, uint32_t level, uint32_t bright) {
+        row[binOf(200.0)] = level;
+        row[binOf(2000.0)] = bright;
+    }
+};
+
+TEST_F(SyllableStarts, ADeepLoudnessDipBetweenTwoLoudStretchesStartsASyllable) {
+    makeSong(BLOCKS);
+    setPitches(0, BLOCKS, 200.0);
+    // Rows 200 .. 207 (blocks 100 .. 103) are a quarter as loud.
+    makeRows(2 * BLOCKS, [&](uint32_t r, uint32_t* row) { voicedRow(row, r >= 200 && r < 208 ? 25000u : 100000u, 1000); });
+    findSyllables(0, BLOCKS);
+    ASSERT_EQ(syllables.startBlocks.size(), 1u);
+    uint32_t start = syllables.startBlocks[0];
+    EXPECT_GE(start, 100u);
+    EXPECT_LE(start, 104u);
+    EXPECT_TRUE(blockData(start).blockFlags & BLOCK_SYLLABLE_START);
+    EXPECT_TRUE(blockOrigData(start).blockFlags & BLOCK_SYLLABLE_START);
+    int marked = 0;
+    for (uint32_t b = 0; b < BLOCKS; b++) marked += (blockData(b).blockFlags & BLOCK_SYLLABLE_START) != 0;
+    EXPECT_EQ(marked, 1);
+}
+
+TEST_F(SyllableStarts, AShallowDipIsNoSyllable) {
+    makeSong(BLOCKS);
+    setPitches(0, BLOCKS, 200.0);
+    makeRows(2 * BLOCKS, [&](uint32_t r, uint32_t* row) { voicedRow(row, r >= 200 && r < 208 ? 50000u : 100000u, 1000); });
+    findSyllables(0, BLOCKS);
+    EXPECT_TRUE(syllables.startBlocks.empty());
+}
+
+TEST_F(SyllableStarts, AConsonantStartsASyllableOnlyWithDetectSyllablesOn) {
+    // The rows around 200 brighten (share above the split from 0.01 to 0.6) and lose loudness
+    // to 0.45 of the vowels: not deep enough for a dip, a consonant all the same.
+    auto consonant = [&](uint32_t r, uint32_t* row) {
+        bool inside = r >= 198 && r < 204;
+        voicedRow(row, inside ? 18000u : 100000u, inside ? 27000u : 1000u);
+    };
+    makeSong(BLOCKS);
+    setPitches(0, BLOCKS, 200.0);
+    makeRows(2 * BLOCKS, consonant);
+    generalSettings.detectSyllables = true;
+    findSyllables(0, BLOCKS);
+    ASSERT_EQ(syllables.startBlocks.size(), 1u);
+    EXPECT_GE(syllables.startBlocks[0], 100u);
+    EXPECT_LE(syllables.startBlocks[0], 103u) << "where the brightness has fallen back";
+
+    generalSettings.detectSyllables = false;
+    findSyllables(0, BLOCKS);
+    EXPECT_TRUE(syllables.startBlocks.empty());
+    EXPECT_FALSE(blockData(102).blockFlags & BLOCK_SYLLABLE_START) << "the earlier start is cleared";
+}
+
+TEST_F(SyllableStarts, BlocksTheSpectrogramNoLongerCoversKeepTheirStarts) {
+    makeSong(BLOCKS);
+    setPitches(0, BLOCKS, 200.0);
+    blockData(20).blockFlags |= BLOCK_SYLLABLE_START;
+    blockOrigData(20).blockFlags |= BLOCK_SYLLABLE_START;
+    blockData(150).blockFlags |= BLOCK_SYLLABLE_START;
+    // The rows begin at block 100.
+    makeRows(200, [&](uint32_t, uint32_t* row) { voicedRow(row, 100000u, 1000); });
+    magnitudeSpectrogram.firstRowPosition = sampleOf(100);
+    findSyllables(0, BLOCKS);
+    EXPECT_TRUE(blockData(20).blockFlags & BLOCK_SYLLABLE_START);
+    EXPECT_TRUE(blockOrigData(20).blockFlags & BLOCK_SYLLABLE_START);
+    EXPECT_FALSE(blockData(150).blockFlags & BLOCK_SYLLABLE_START);
+}
+
+TEST_F(SyllableStarts, TheBrightnessRatioSplitsAtTwiceTheFundamental) {
+    makeSong(10);
+    std::vector<uint32_t> row(magnitudeSpectrogram.binsPerRow, 0u);
+    double width = magnitudeSpectrogram.binWidth;
+    uint32_t count = uint32_t(row.size());
+    row[binOf(300.0)] = 100;
+    row[binOf(1000.0)] = 50;
+    EXPECT_DOUBLE_EQ(brightnessRatio(row.data(), count, width, 200.0), 0.5);
+    // A fundamental of 1048 Hz splits at 2096 Hz and halves the ratio.
+    row[binOf(2500.0)] = 60;
+    EXPECT_DOUBLE_EQ(brightnessRatio(row.data(), count, width, 1048.0), 0.2);
+    // The split stops at 3000 Hz.
+    row[binOf(2500.0)] = 0;
+    row[binOf(3500.0)] = 75;
+    EXPECT_DOUBLE_EQ(brightnessRatio(row.data(), count, width, 2000.0), 75.0 / 150.0 / (2000.0 / 524.0));
+    // Nothing below the split: the magnitude above alone.
+    std::fill(row.begin(), row.end(), 0u);
+    row[binOf(1000.0)] = 40;
+    row[1] = 999;   // below the fourth bin: never counted
+    EXPECT_DOUBLE_EQ(brightnessRatio(row.data(), count, width, 200.0), 40.0);
+}
