@@ -1,87 +1,105 @@
-// The stand-in song window: the song's notes as a table.
+// The song window: toolbar, song view and level meter.
 #include "app/songWindow.h"
 
 #include <QCloseEvent>
-#include <QHeaderView>
-#include <QLabel>
-#include <QTableWidget>
+#include <QToolBar>
+#include <QToolButton>
 #include <QVBoxLayout>
 
+#include "app/appStyle.h"
+#include "app/levelMeter.h"
+#include "app/mainFrame.h"
+#include "app/songView.h"
 #include "notes/displayModes.h"
-#include "notes/noteList.h"
-#include "notes/selection.h"
+#include "playback/playbackState.h"
+#include "playback/pointerInfo.h"
+#include "playback/songViewGeometry.h"
+#include "shell/commandDispatch.h"
+#include "shell/commandTable.h"
 #include "shell/mainFrame.h"
-#include "store/song.h"
-
-QString semitoneName(int semitone) {
-    static const char* const names[12] = {"C", "C#/Db", "D", "D#/Eb", "E", "F", "F#/Gb", "G", "G#/Ab", "A", "A#/Bb", "B"};
-    if (semitone < 0) return QString();
-    return QString("%1%2").arg(names[semitone % 12]).arg(semitone / 12 - 1);
-}
+#include "shell/settings.h"
 
 SongWindow::SongWindow(QWidget* parent) : QWidget(parent) {
-    setObjectName("Waveview");
+    setObjectName("songWindow");
     auto* layout = new QVBoxLayout(this);
     layout->setContentsMargins(0, 0, 0, 0);
     layout->setSpacing(0);
 
-    summary = new QLabel(this);
-    summary->setObjectName("songSummary");
-    summary->setContentsMargins(12, 8, 12, 8);
-    summary->setStyleSheet("QLabel#songSummary { background: #f7f9fb; border-bottom: 1px solid #e1e5ea;"
-                           " color: #3c4856; }");
-    layout->addWidget(summary);
+    toolbar = new QToolBar(this);
+    toolbar->setObjectName("OwnToolbar");
+    toolbar->setFixedHeight(SONG_VIEW_TOOLBAR_HEIGHT);
+    toolbar->setIconSize(QSize(16, 16));
+    toolbar->setToolButtonStyle(Qt::ToolButtonTextBesideIcon);
+    const char* names[5] = {"playbackModeButton", "noteModeButton", "layoutButton", "playButton", "fitButton"};
+    for (int i = 0; i < 5; i++) {
+        buttons[i] = new QToolButton(toolbar);
+        buttons[i]->setObjectName(names[i]);
+        buttons[i]->setAutoRaise(true);
+        buttons[i]->setToolButtonStyle(Qt::ToolButtonTextBesideIcon);
+        if (i == 3) toolbar->addSeparator();
+        toolbar->addWidget(buttons[i]);
+    }
+    buttons[4]->setText("Fit");
+    buttons[4]->setToolTip("Zoom so that the whole song fits the window");
+    connect(buttons[0], &QToolButton::clicked, this, [this] {
+        runCommand(displayModes.playbackMode == PLAYBACK_MODE_WAVE ? CMD_MIDI_MODE : CMD_WAVE_MODE);
+    });
+    connect(buttons[1], &QToolButton::clicked, this, [this] {
+        runCommand(displayModes.noteMode == NOTE_MODE_DETAIL ? CMD_NOTE_MODE : CMD_DETAIL_MODE);
+    });
+    connect(buttons[2], &QToolButton::clicked, this, [this] {
+        runCommand(globalSettings.scaleMode & LAYOUT_CHROMATIC ? CMD_DIATONIC : CMD_CHROMATIC);
+    });
+    connect(buttons[3], &QToolButton::clicked, this, [this] { runCommand(CMD_PLAY_STOP); });
+    connect(buttons[4], &QToolButton::clicked, this, [this] {
+        if (fitZoomToWindow()) {
+            updateFrameDisplay();
+            refresh();
+        }
+    });
+    layout->addWidget(toolbar);
 
-    table = new QTableWidget(0, 6, this);
-    table->setObjectName("noteTable");
-    table->setHorizontalHeaderLabels({"Note", "Pitch", "Frequency (Hz)", "Start (s)", "End (s)", "Volume"});
-    table->verticalHeader()->setVisible(false);
-    table->setEditTriggers(QAbstractItemView::NoEditTriggers);
-    table->setSelectionMode(QAbstractItemView::NoSelection);
-    table->setFocusPolicy(Qt::NoFocus);
-    table->setAlternatingRowColors(true);
-    table->horizontalHeader()->setSectionResizeMode(QHeaderView::Stretch);
-    table->horizontalHeader()->setDefaultAlignment(Qt::AlignLeft | Qt::AlignVCenter);
-    layout->addWidget(table, 1);
+    view = new SongView(this);
+    layout->addWidget(view, 1);
+    setFocusProxy(view);
     refresh();
 }
 
-void SongWindow::refresh() {
-    QString modes = QString("%1 mode, %2 mode")
-                        .arg(displayModes.playbackMode == PLAYBACK_MODE_WAVE ? "Wave" : "MIDI")
-                        .arg(displayModes.noteMode == NOTE_MODE_DETAIL ? "Detail" : "Note");
-    QString audio = song.blockCount == 0
-                        ? QString("no audio")
-                        : QString("%1 s of audio at %2 Hz, %3-bit")
-                              .arg(songDuration(), 0, 'f', 2)
-                              .arg(song.waveFormat.samplesPerSec)
-                              .arg(song.waveFormat.bitsPerSample);
-    summary->setText(QString("<b>%1 notes</b> &nbsp;·&nbsp; %2 &nbsp;·&nbsp; %3 selected &nbsp;·&nbsp; %4"
-                             "<br><span style='color:#7a8490'>Note list of the song. The piano-roll song view "
-                             "is not available in this version.</span>")
-                         .arg(noteList.count)
-                         .arg(audio)
-                         .arg(selection.selectedNoteCount)
-                         .arg(modes));
+SongWindow::~SongWindow() {
+    if (meter) delete meter.data();
+}
 
-    table->setRowCount(noteList.count);
-    QColor selectedColor(0xd5, 0xe4, 0xf3);
-    for (int i = 0; i < noteList.count; i++) {
-        const Note& n = noteList.notes[i];
-        bool note = displayModes.playbackMode == PLAYBACK_MODE_MIDI;
-        const QString cells[6] = {QString::number(i + 1),
-                                  semitoneName(n.midiNote),
-                                  QString::number(n.pitch, 'f', 1),
-                                  QString::number(note ? n.midiStart : n.waveStart, 'f', 3),
-                                  QString::number(note ? n.midiEnd : n.waveEnd, 'f', 3),
-                                  QString::number(n.volumeSum)};
-        bool selected = isNoteSelected(i) == 1;
-        for (int c = 0; c < 6; c++) {
-            auto* item = new QTableWidgetItem(cells[c]);
-            if (selected) item->setBackground(selectedColor);
-            table->setItem(i, c, item);
-        }
+void SongWindow::runCommand(int id) {
+    if (MainFrame* frame = mainFrame()) frame->runCommand(id);
+    else dispatchCommand(id);
+    refresh();
+}
+
+void SongWindow::showEvent(QShowEvent* event) {
+    QWidget::showEvent(event);
+    // The meter is a tool window of the frame, created with the view the first time it shows.
+    if (!meter) {
+        meter = new MeterWindow(window(), view);
+        meter->show();
     }
+}
+
+void SongWindow::refresh() {
+    bool wave = displayModes.playbackMode == PLAYBACK_MODE_WAVE;
+    buttons[0]->setText(wave ? "Wave" : "MIDI");
+    buttons[0]->setIcon(appIcon(wave ? ICON_WAVE : ICON_MIDI));
+    buttons[0]->setToolTip(wave ? "Playback mode: Wave. Click for MIDI." : "Playback mode: MIDI. Click for Wave.");
+    bool detail = displayModes.noteMode == NOTE_MODE_DETAIL;
+    buttons[1]->setText(detail ? "Detail" : "Note");
+    buttons[1]->setIcon(appIcon(detail ? ICON_DETAIL_MODE : ICON_NOTE_MODE));
+    buttons[1]->setToolTip(detail ? "Note mode: Detail. Click for Note." : "Note mode: Note. Click for Detail.");
+    bool chromatic = globalSettings.scaleMode & LAYOUT_CHROMATIC;
+    buttons[2]->setText(chromatic ? "Chromatic" : "Diatonic");
+    buttons[2]->setIcon(appIcon(chromatic ? ICON_CHROMATIC : ICON_DIATONIC));
+    buttons[2]->setToolTip(chromatic ? "Layout: Chromatic. Click for Diatonic." : "Layout: Diatonic. Click for Chromatic.");
+    buttons[3]->setText(playbackRunning() ? "Stop" : "Play");
+    view->songChanged();
+    if (meter) meter->update();
 }
 
 void SongWindow::closeEvent(QCloseEvent* event) {
@@ -90,5 +108,6 @@ void SongWindow::closeEvent(QCloseEvent* event) {
         return;
     }
     event->accept();
+    if (meter) meter->hide();
     songWindowClosed();
 }

@@ -1,30 +1,40 @@
 #pragma once
-// The song's child window in the MDI area (window class WaveviewM, titled "Waveview display").
-// Until the piano-roll song view is built it shows the song plainly: a line on the song and
-// its note list as a table, with the selected notes marked. Asked to close, it answers with
-// the song's close guard and closes the song when it goes.
+// The song's child window in the MDI area (window class WaveviewM, titled "Waveview display"):
+// a 26-pixel toolbar with the playback mode, note mode and layout buttons and Play, the song
+// view's drawing window below it, and the level meter beside it. Asked to close, it answers
+// with the song's close guard and closes the song when it goes.
 
+#include <QPointer>
+
+#include "app/levelMeter.h"
 #include <QWidget>
 
-class QLabel;
-class QTableWidget;
+
+class QToolBar;
+class QToolButton;
+class SongView;
 
 class SongWindow : public QWidget {
     Q_OBJECT
 public:
     explicit SongWindow(QWidget* parent = nullptr);
-    // Shows the song's current notes, selection and modes.
+    ~SongWindow() override;
+    // The song, its modes or the zoom changed: buttons, view and meter follow.
     void refresh();
-    QTableWidget* noteTable() const { return table; }
-    QLabel* summaryLabel() const { return summary; }
+    SongView* songView() const { return view; }
+    MeterWindow* meterWindow() const { return meter; }
+    // 0 playback mode, 1 note mode, 2 layout, 3 Play/Stop, 4 fit to window.
+    QToolButton* toolbarButton(int which) const { return which >= 0 && which < 5 ? buttons[which] : nullptr; }
 
 protected:
     void closeEvent(QCloseEvent* event) override;
+    void showEvent(QShowEvent* event) override;
 
 private:
-    QLabel* summary;
-    QTableWidget* table;
-};
+    void runCommand(int id);
 
-// The chromatic name of a semitone with its octave (69 is "A4", 61 "C#/Db4").
-QString semitoneName(int semitone);
+    QToolBar* toolbar;
+    QToolButton* buttons[5] = {};
+    SongView* view;
+    QPointer<MeterWindow> meter;
+};

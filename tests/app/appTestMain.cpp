@@ -14,6 +14,7 @@
 int runMainFrameTests(int argc, char** argv);
 int runQtPlatformTests(int argc, char** argv);
 int runDesktopStartupTests(int argc, char** argv);
+int runSongViewTests(int argc, char** argv);
 
 int main(int argc, char** argv) {
     if (qEnvironmentVariableIsEmpty("QT_QPA_PLATFORM")) qputenv("QT_QPA_PLATFORM", "offscreen");
@@ -33,5 +34,6 @@ int main(int argc, char** argv) {
     failures += runMainFrameTests(argc, argv) != 0;
     failures += runQtPlatformTests(argc, argv) != 0;
     failures += runDesktopStartupTests(argc, argv) != 0;
+    failures += runSongViewTests(argc, argv) != 0;
     return failures;
 }

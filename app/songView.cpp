@@ -1,0 +1,122 @@
+// The song view's drawing window.
+#include "app/songView.h"
+
+#include <mutex>
+
+#include <QKeyEvent>
+#include <QMouseEvent>
+#include <QPainter>
+#include <QScrollBar>
+#include <QTimer>
+
+#include "app/songViewPainter.h"
+#include "audio/audioActivity.h"
+#include "notes/displayModes.h"
+#include "platform/sync.h"
+#include "playback/playbackState.h"
+#include "playback/pointerInfo.h"
+#include "playback/songViewGeometry.h"
+#include "store/ftBlockStore.h"
+#include "store/song.h"
+
+SongView::SongView(QWidget* parent) : QAbstractScrollArea(parent) {
+    setObjectName("Waveview");
+    setFrameShape(QFrame::NoFrame);
+    setHorizontalScrollBarPolicy(Qt::ScrollBarAlwaysOn);
+    setVerticalScrollBarPolicy(Qt::ScrollBarAlwaysOn);
+    setFocusPolicy(Qt::StrongFocus);
+    viewport()->setMouseTracking(true);
+    viewport()->setAttribute(Qt::WA_OpaquePaintEvent);
+    horizontalScrollBar()->setSingleStep(SCROLL_STEP);
+    verticalScrollBar()->setSingleStep(SCROLL_STEP);
+    resetSongViewGeometry();
+}
+
+SongView::~SongView() {
+    resetSongViewGeometry();
+    resetPointerInfo();
+}
+
+void SongView::songChanged() {
+    layoutSongView(viewport()->width(), viewport()->height());
+    if (audioActivity.opening) scrollToSongEnd();
+    updateScrollBars();
+    refreshPointerInfo();
+    viewport()->update();
+}
+
+void SongView::updateScrollBars() {
+    updatingScrollBars = true;
+    horizontalScrollBar()->setRange(0, maxScrollX());
+    horizontalScrollBar()->setPageStep(std::max(1, visiblePlotWidth()));
+    horizontalScrollBar()->setValue(songViewGeometry.scrollX);
+    verticalScrollBar()->setRange(0, maxScrollY());
+    verticalScrollBar()->setPageStep(std::max(1, visiblePlotHeight()));
+    verticalScrollBar()->setValue(songViewGeometry.scrollY);
+    updatingScrollBars = false;
+}
+
+void SongView::scrollContentsBy(int, int) {
+    if (updatingScrollBars) return;
+    setSongViewScroll(horizontalScrollBar()->value(), verticalScrollBar()->value());
+    viewport()->update();
+}
+
+void SongView::resizeEvent(QResizeEvent* event) {
+    QAbstractScrollArea::resizeEvent(event);
+    layoutSongView(viewport()->width(), viewport()->height());
+    updateScrollBars();
+}
+
+// Detail mode draws the blocks the FT block window holds; when the visible stretch lies
+// outside it, the window is moved there. Never while the worker fills it.
+void SongView::loadVisibleBlocks() {
+    if (displayModes.noteMode != NOTE_MODE_DETAIL || recordingOrOpeningActive() || song.blockCount == 0) return;
+    uint32_t from = blockAtTime(std::max(0.0, xToTime(songViewGeometry.plotLeft)));
+    uint32_t to = std::min(song.blockCount, blockAtTime(std::max(0.0, xToTime(viewport()->width()))) + 1);
+    if (from >= ftBlockWindow.firstBlock && to <= ftBlockWindow.endBlock) return;
+    if (from == failedWindowStart || ftBlockWindow.capacity == 0) return;
+    if (!loadFTBlockWindow(from, to) && !(from >= ftBlockWindow.firstBlock && to <= ftBlockWindow.endBlock))
+        failedWindowStart = from;
+}
+
+void SongView::paintEvent(QPaintEvent*) {
+    QPainter screen(viewport());
+    QSize size = viewport()->size();
+    if (image.size() != size) image = QImage(size, QImage::Format_RGB32);
+    // While the worker analyses, its chunk must not change the song under the painter; a
+    // picture that cannot have the song now keeps the last one and tries again shortly.
+    std::unique_lock<std::mutex> processing(CSWaveProcessingMutex, std::defer_lock);
+    if (recordingOrOpeningActive() && !processing.try_lock()) {
+        screen.drawImage(0, 0, image);
+        QTimer::singleShot(30, viewport(), [this] { viewport()->update(); });
+        return;
+    }
+    loadVisibleBlocks();
+    if (!paintSongView(image)) {
+        screen.fillRect(viewport()->rect(), Qt::white);
+        screen.setPen(Qt::black);
+        screen.drawText(8, 20, DISPLAY_PROBLEM_TEXT);
+        return;
+    }
+    if (processing.owns_lock()) processing.unlock();
+    screen.drawImage(0, 0, image);
+    if (horizontalScrollBar()->maximum() != maxScrollX() || verticalScrollBar()->maximum() != maxScrollY())
+        updateScrollBars();
+}
+
+void SongView::mouseMoveEvent(QMouseEvent* event) {
+    QPoint at = event->position().toPoint();
+    updatePointerInfo(at.x(), at.y());
+    viewport()->update(QRect(0, viewport()->height() - PLOT_BOTTOM_MARGIN, viewport()->width(), PLOT_BOTTOM_MARGIN));
+    QAbstractScrollArea::mouseMoveEvent(event);
+}
+
+void SongView::keyPressEvent(QKeyEvent* event) {
+    switch (event->key()) {
+    case Qt::Key_Home: horizontalScrollBar()->setValue(0); break;
+    case Qt::Key_End: horizontalScrollBar()->setValue(horizontalScrollBar()->maximum()); break;
+    default: QAbstractScrollArea::keyPressEvent(event); return;
+    }
+    event->accept();
+}
