@@ -18,7 +18,7 @@ struct CommandOperations {
     void (*playSong)(double start, double end, int preview);   // play, or stop (toggle)
     void (*pausePlayback)();                           // before a mode change
     int (*runNoteCommand)(int command);                // the Notes menu's commands, by CommandId
-    int (*writeNotesMidiFile)(const std::string& path, int detail);   // save as MIDI; 1 written
+    int (*writeNotesMidiFile)(const std::string& path, int detail, int onlySelectedRange);   // save as MIDI; 1 written
     int (*canUndo)();                                  // an undo step exists
     int (*canRedo)();                                  // a redo step exists
     int (*clipboardKind)();                            // the time clipboard's kind; 0 when empty

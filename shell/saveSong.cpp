@@ -67,7 +67,7 @@ int writeSongOutput(const std::string& path, bool onlySelectedRange) {
         }
         written = writeWaveSegment(path, start, end);
     } else {
-        written = commandOperations.writeNotesMidiFile(path, type == OUTPUT_DETAIL_MIDI ? 1 : 0);
+        written = commandOperations.writeNotesMidiFile(path, type == OUTPUT_DETAIL_MIDI ? 1 : 0, onlySelectedRange ? 1 : 0);
     }
     if (!written) return 0;
     songNames.remembered[type] = path;

@@ -8,12 +8,13 @@
 #include "audio/waveWorkingFile.h"
 #include "frameFixtures.h"
 #include "platform/files.h"
+#include "playback/midiOutput.h"
 #include "shell/paths.h"
 #include "support/testSupport.h"
 
 namespace {
 
-std::vector<std::string> midiWrites;   // "path detail" for each stand-in MIDI write
+std::vector<std::string> midiWrites;   // "path detail range" for each stand-in MIDI write
 
 class CommandTableSave : public FrameTest {
 protected:
@@ -47,8 +48,8 @@ protected:
         FrameTest::TearDown();
     }
     void installMidiWriter() {
-        commandOperations.writeNotesMidiFile = [](const std::string& path, int detail) {
-            midiWrites.push_back(path + " " + std::to_string(detail));
+        commandOperations.writeNotesMidiFile = [](const std::string& path, int detail, int onlySelectedRange) {
+            midiWrites.push_back(path + " " + std::to_string(detail) + " " + std::to_string(onlySelectedRange));
             return 1;
         };
     }
@@ -161,7 +162,18 @@ TEST_F(CommandTableSave, MidiOutputGoesToTheMidiWriterAndIsReportedWhenThereIsNo
     EXPECT_EQ(saveSong(), SAVE_NEEDS_DIALOG);   // the plain MIDI name is a name of its own
     displayModes.noteMode = NOTE_MODE_DETAIL;
     EXPECT_EQ(saveSong(), SAVE_WRITTEN);
-    EXPECT_EQ(midiWrites, std::vector<std::string>({out + " 1", out + " 1"}));
+    ASSERT_EQ(writeSongOutput(out, true), 1);
+    EXPECT_EQ(midiWrites, std::vector<std::string>({out + " 1 0", out + " 1 0", out + " 1 1"}));
+}
+
+TEST_F(CommandTableSave, TheProgramSavesMidiThroughTheMidiWriter) {
+    displayModes.playbackMode = PLAYBACK_MODE_MIDI;
+    commandOperations.writeNotesMidiFile = saveMidiFile;
+    std::string out = folder.file("take.mid");
+    ASSERT_EQ(writeSongOutput(out, false), 1);
+    std::vector<uint8_t> bytes = readFileBytes(out);
+    ASSERT_GE(bytes.size(), 14u);
+    EXPECT_EQ(std::string(bytes.begin(), bytes.begin() + 4), "MThd");
 }
 
 TEST_F(CommandTableSave, ClosingTheSongForgetsItsNames) {
