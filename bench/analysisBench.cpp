@@ -18,6 +18,7 @@
 #include <string>
 #include <vector>
 
+#include "benchFolder.h"
 #include "analysis/analysisGeometry.h"
 #include "analysis/chunkedAnalysis.h"
 #include "analysis/frequencyAnalysis.h"
@@ -102,9 +103,8 @@ int main(int argc, char** argv) {
     std::vector<double> lengths;
     for (int i = 1; i < argc; i++) lengths.push_back(std::atof(argv[i]));
     if (lengths.empty()) lengths = {60.0, 600.0};
-    std::string pattern = (std::filesystem::temp_directory_path() / "analysisBenchXXXXXX").string();
-    const char* folder = mkdtemp(pattern.data());
-    if (!folder) return 1;
+    std::string benchFolder = makeBenchFolder("analysisBench");
+    const char* folder = benchFolder.c_str();
     int failures = 0;
     for (int settings : {DEFAULT_SETTINGS, ENHANCED_ACCURACY, NO_WAVE_EDITING}) {
         for (double seconds : lengths) {
@@ -118,9 +118,5 @@ int main(int argc, char** argv) {
             }
         }
     }
-    std::string shared = std::string(folder) + "/Torvellan Shared";
-    for (const char* name : {"CS.ft", "CS.fi", "CS.ft+", "CS.fi+"}) std::remove((shared + "/" + name).c_str());
-    rmdir(shared.c_str());
-    rmdir(folder);
     return failures ? 1 : 0;
 }

@@ -12,6 +12,7 @@
 #include <string>
 #include <vector>
 
+#include "benchFolder.h"
 #include "platform/files.h"
 #include "platform/ui.h"
 #include "shell/paths.h"
@@ -22,14 +23,7 @@ static const double SAMPLE_BLOCK_DURATION = 512.0 / 44100.0;                  //
 static const uint32_t SONG_BLOCKS = uint32_t(600.0 / SAMPLE_BLOCK_DURATION);  // ten minutes
 static const uint32_t FULL_BLOCK_BYTES = ftBlockBytes(255, 255, 15);
 
-struct BenchFolder {
-    std::string base;   // temporary shared base path
-    ~BenchFolder() {
-        std::error_code ignored;
-        if (!base.empty()) std::filesystem::remove_all(base, ignored);
-    }
-};
-static BenchFolder benchFolder;
+static std::string benchFolder;   // the temporary shared base path, made on first use
 
 static void fillEntries(FrequencyEntry* entries, uint32_t count, uint32_t seed) {
     for (uint32_t i = 0; i < count; i++) {
@@ -40,16 +34,9 @@ static void fillEntries(FrequencyEntry* entries, uint32_t count, uint32_t seed) 
 
 // A song of SONG_BLOCKS blocks and a window filled with full blocks, as the analysis leaves it.
 static void setUpSong() {
-    if (benchFolder.base.empty()) {
-        std::string pattern = (std::filesystem::temp_directory_path() / "ftStoreBench-XXXXXX").string();
-        std::vector<char> name(pattern.begin(), pattern.end());
-        name.push_back('\0');
-        if (!mkdtemp(name.data())) {
-            std::fprintf(stderr, "ftStoreBench: cannot make a temporary folder\n");
-            std::exit(1);
-        }
-        benchFolder.base = name.data();
-        setSharedBasePath(benchFolder.base);
+    if (benchFolder.empty()) {
+        benchFolder = makeBenchFolder("ftStoreBench");
+        setSharedBasePath(benchFolder);
         makeFolder(paths.sharedFolder);
     }
     closeFTFile(0);

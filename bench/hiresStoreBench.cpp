@@ -16,6 +16,7 @@
 #include <string>
 #include <vector>
 
+#include "benchFolder.h"
 #include "platform/files.h"
 #include "shell/paths.h"
 #include "store/ftBlockStore.h"
@@ -33,14 +34,7 @@ static const double BIN_SPACING = SAMPLE_RATE / 2 / BLOCK_SAMPLES;              
 // keeps the benchmark's memory small (the full 30-second window would take 677 MB).
 static const uint32_t WINDOW_BLOCKS = 64;
 
-struct BenchFolder {
-    std::string base;   // temporary shared base path
-    ~BenchFolder() {
-        std::error_code ignored;
-        if (!base.empty()) std::filesystem::remove_all(base, ignored);
-    }
-};
-static BenchFolder benchFolder;
+static std::string benchFolder;   // the temporary shared base path, made on first use
 
 // Power spectrum of one block of a sung tone around 220 Hz with a 5.5 Hz vibrato of half a
 // semitone: twelve harmonics falling 6 dB each, every peak spread over a Hann main lobe of
@@ -67,16 +61,9 @@ static void fillBlock(double* bins, uint32_t block, std::mt19937& random) {
 }
 
 static void setUpSong() {
-    if (benchFolder.base.empty()) {
-        std::string pattern = (std::filesystem::temp_directory_path() / "hiresStoreBench-XXXXXX").string();
-        std::vector<char> name(pattern.begin(), pattern.end());
-        name.push_back('\0');
-        if (!mkdtemp(name.data())) {
-            std::fprintf(stderr, "hiresStoreBench: cannot make a temporary folder\n");
-            std::exit(1);
-        }
-        benchFolder.base = name.data();
-        setSharedBasePath(benchFolder.base);
+    if (benchFolder.empty()) {
+        benchFolder = makeBenchFolder("hiresStoreBench");
+        setSharedBasePath(benchFolder);
         makeFolder(paths.sharedFolder);
     }
     closeHiresFTFile(0);

@@ -18,6 +18,7 @@
 #include <string>
 #include <vector>
 
+#include "benchFolder.h"
 #include "audio/audioActivity.h"
 #include "audio/openWaveFile.h"
 #include "audio/openWaveWorker.h"
@@ -110,9 +111,9 @@ int main(int argc, char** argv) {
         else if (std::strcmp(argv[i], "--enhanced") == 0) enhanced = true;
         else seconds = std::atof(argv[i]);
     }
-    std::string pattern = (std::filesystem::temp_directory_path() / "openWaveBenchXXXXXX").string();
-    const char* folder = mkdtemp(pattern.data());
-    if (!folder || seconds <= 0) return 1;
+    std::string benchFolder = makeBenchFolder("openWaveBench");
+    const char* folder = benchFolder.c_str();
+    if (seconds <= 0) return 1;
     std::string config = std::string(folder) + "/config";
     setenv("MELODRIFT_CONFIG_DIR", config.c_str(), 1);
     run.path = std::string(folder) + "/melody.wav";
@@ -142,7 +143,6 @@ int main(int argc, char** argv) {
     int notes = noteList.count;
     closeSong();
     shutDown(0);
-    std::filesystem::remove_all(folder);
     if (exitCode != 0 || run.end <= 0) {
         std::printf("the opening did not run\n");
         return 1;

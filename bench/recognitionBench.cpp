@@ -16,6 +16,7 @@
 #include <string>
 #include <vector>
 
+#include "benchFolder.h"
 #include "analysis/analysisGeometry.h"
 #include "analysis/frequencyAnalysis.h"
 #include "analysis/recognitionOptions.h"
@@ -79,9 +80,8 @@ int main(int argc, char** argv) {
     std::vector<double> lengths;
     for (int i = 1; i < argc; i++) lengths.push_back(std::atof(argv[i]));
     if (lengths.empty()) lengths = {60.0};
-    std::string pattern = (std::filesystem::temp_directory_path() / "recognitionBenchXXXXXX").string();
-    const char* folder = mkdtemp(pattern.data());
-    if (!folder) return 1;
+    std::string benchFolder = makeBenchFolder("recognitionBench");
+    const char* folder = benchFolder.c_str();
     int failures = 0;
     for (double seconds : lengths) {
         pid_t child = fork();
@@ -93,9 +93,5 @@ int main(int argc, char** argv) {
             failures++;
         }
     }
-    std::string shared = std::string(folder) + "/Torvellan Shared";
-    for (const char* name : {"CS.ft", "CS.fi", "CS.ft+", "CS.fi+"}) std::remove((shared + "/" + name).c_str());
-    rmdir(shared.c_str());
-    rmdir(folder);
     return failures ? 1 : 0;
 }
