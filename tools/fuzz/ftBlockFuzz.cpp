@@ -14,6 +14,7 @@
 #include <string>
 #include <vector>
 
+#include "fuzzSupport.h"
 #include "platform/files.h"
 #include "platform/ui.h"
 #include "shell/paths.h"
@@ -23,31 +24,14 @@
 static const size_t HEAD_BYTES = 5;
 
 // A broken promise of the store is a finding: stop here so the fuzzer keeps the input.
-static void expect(bool holds, const char* what) {
-    if (holds) return;
-    std::fprintf(stderr, "ftBlockFuzz: %s\n", what);
-    std::abort();
-}
-
-static void removeFolder() {
-    std::error_code ignored;
-    std::filesystem::remove_all(paths.sharedBasePath, ignored);
-}
+static void expect(bool holds, const char* what) { fuzzExpect(holds, "ftBlockFuzz", what); }
 
 static void useOwnSharedFolder() {
     static bool ready = false;
     if (ready) return;
-    std::string pattern = (std::filesystem::temp_directory_path() / "ftBlockFuzz-XXXXXX").string();
-    std::vector<char> name(pattern.begin(), pattern.end());
-    name.push_back('\0');
-    if (!mkdtemp(name.data())) {
-        std::fprintf(stderr, "ftBlockFuzz: cannot make a temporary folder\n");
-        std::abort();
-    }
-    setSharedBasePath(name.data());
+    setSharedBasePath(fuzzFolder("ftBlockFuzz"));
     makeFolder(paths.sharedFolder);
     setUiEcho(false);
-    std::atexit(removeFolder);
     ready = true;
 }
 

@@ -18,6 +18,7 @@
 #include <unistd.h>
 #include <vector>
 
+#include "fuzzSupport.h"
 #include "platform/files.h"
 #include "platform/ui.h"
 #include "shell/paths.h"
@@ -33,35 +34,16 @@ static const uint32_t WINDOW_BLOCKS = 8;
 static const size_t GUARD_VALUES = 8;
 static const double GUARD = -12345.0;
 
-static std::string folder;   // the private shared base path, removed at exit
-
-static void removeFolder() {
-    if (folder.empty()) return;
-    std::error_code ignored;
-    std::filesystem::remove_all(folder, ignored);
-}
-
 static void useFuzzFolder() {
-    if (!folder.empty()) return;
-    std::string pattern = (std::filesystem::temp_directory_path() / "hiresBlockFuzz-XXXXXX").string();
-    std::vector<char> name(pattern.begin(), pattern.end());
-    name.push_back('\0');
-    if (!mkdtemp(name.data())) {
-        std::fprintf(stderr, "hiresBlockFuzz: cannot make a temporary folder\n");
-        std::abort();
-    }
-    folder = name.data();
-    std::atexit(removeFolder);
-    setSharedBasePath(folder);
+    static bool ready = false;
+    if (ready) return;
+    setSharedBasePath(fuzzFolder("hiresBlockFuzz"));
     makeFolder(paths.sharedFolder);
+    ready = true;
 }
 
 // A broken promise of the store is a finding: stop here so the fuzzer keeps the input.
-static void expect(bool holds, const char* what) {
-    if (holds) return;
-    std::fprintf(stderr, "hiresBlockFuzz: %s\n", what);
-    std::abort();
-}
+static void expect(bool holds, const char* what) { fuzzExpect(holds, "hiresBlockFuzz", what); }
 
 static void writeBytes(const std::string& path, const uint8_t* bytes, size_t count) {
     FILE* f = std::fopen(path.c_str(), "wb");

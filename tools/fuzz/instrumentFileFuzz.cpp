@@ -12,35 +12,19 @@
 #include <string>
 #include <vector>
 
+#include "fuzzSupport.h"
 #include "analysis/instrumentDefinitions.h"
 #include "platform/ui.h"
 
 static std::string folder;   // the target's own temporary folder, ending in "/"
 
 // A broken promise of the loader is a finding: stop here so the fuzzer keeps the input.
-static void expect(bool holds, const char* what) {
-    if (holds) return;
-    std::fprintf(stderr, "instrumentFileFuzz: %s\n", what);
-    std::abort();
-}
-
-static void removeFolder() {
-    std::error_code ignored;
-    std::filesystem::remove_all(folder, ignored);
-}
+static void expect(bool holds, const char* what) { fuzzExpect(holds, "instrumentFileFuzz", what); }
 
 static void useOwnFolder() {
     if (!folder.empty()) return;
-    std::string pattern = (std::filesystem::temp_directory_path() / "instrumentFileFuzz-XXXXXX").string();
-    std::vector<char> name(pattern.begin(), pattern.end());
-    name.push_back('\0');
-    if (!mkdtemp(name.data())) {
-        std::fprintf(stderr, "instrumentFileFuzz: cannot make a temporary folder\n");
-        std::abort();
-    }
-    folder = std::string(name.data()) + "/";
+    folder = fuzzFolder("instrumentFileFuzz");
     setUiEcho(false);
-    std::atexit(removeFolder);
 }
 
 static std::vector<uint8_t> readAll(const std::string& path) {

@@ -12,6 +12,7 @@
 #include <unistd.h>
 #include <vector>
 
+#include "fuzzSupport.h"
 #include "audio/waveFile.h"
 #include "platform/files.h"
 #include "platform/ui.h"
@@ -65,11 +66,7 @@ static int storeInput(const FuzzInput& input, const uint8_t* data, size_t size) 
 }
 
 // A broken promise of the reader is a finding: stop here so the fuzzer keeps the input.
-static void expect(bool holds, const char* what) {
-    if (holds) return;
-    std::fprintf(stderr, "wioFileOpenFuzz: %s\n", what);
-    std::abort();
-}
+static void expect(bool holds, const char* what) { fuzzExpect(holds, "wioFileOpenFuzz", what); }
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     const FuzzInput& input = openFuzzInput();
