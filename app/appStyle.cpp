@@ -12,6 +12,11 @@
 #include <QPixmap>
 #include <QProxyStyle>
 #include <QStyleFactory>
+#include <QToolButton>
+
+#include "notes/displayModes.h"
+#include "shell/mainFrame.h"
+#include "shell/settings.h"
 
 QColor accentColor() { return QColor(0x2f, 0x6d, 0xa8); }
 QColor workspaceColor() { return QColor(0xe4, 0xe8, 0xed); }
@@ -236,4 +241,19 @@ QIcon appIcon(AppIcon which) {
         icon.addPixmap(pixmap);
     }
     return icon;
+}
+
+void showModeButtons(QToolButton* playback, QToolButton* note, QToolButton* layout) {
+    bool wave = displayModes.playbackMode == PLAYBACK_MODE_WAVE;
+    playback->setText(wave ? "Wave" : "MIDI");
+    playback->setIcon(appIcon(wave ? ICON_WAVE : ICON_MIDI));
+    playback->setToolTip(wave ? "Playback mode: Wave. Click for MIDI." : "Playback mode: MIDI. Click for Wave.");
+    bool detail = displayModes.noteMode == NOTE_MODE_DETAIL;
+    note->setText(detail ? "Detail" : "Note");
+    note->setIcon(appIcon(detail ? ICON_DETAIL_MODE : ICON_NOTE_MODE));
+    note->setToolTip(detail ? "Note mode: Detail. Click for Note." : "Note mode: Note. Click for Detail.");
+    bool chromatic = globalSettings.scaleMode & LAYOUT_CHROMATIC;
+    layout->setText(chromatic ? "Chromatic" : "Diatonic");
+    layout->setIcon(appIcon(chromatic ? ICON_CHROMATIC : ICON_DIATONIC));
+    layout->setToolTip(chromatic ? "Layout: Chromatic. Click for Diatonic." : "Layout: Diatonic. Click for Chromatic.");
 }

@@ -6,6 +6,7 @@
 #include <QIcon>
 
 class QApplication;
+class QToolButton;
 
 // The palette's accent and the MDI area's background.
 QColor accentColor();
@@ -26,3 +27,7 @@ enum AppIcon {
     ICON_MENU           // the button that opens the popup menu
 };
 QIcon appIcon(AppIcon which);
+
+// The three mode buttons of the frame's and the song window's toolbars show the playback
+// mode, the note mode and the layout in force, with a tip saying what a click does.
+void showModeButtons(QToolButton* playback, QToolButton* note, QToolButton* layout);

@@ -413,18 +413,7 @@ SongWindow* MainFrame::songWindow() const {
 }
 
 void MainFrame::refreshFrame() {
-    bool wave = displayModes.playbackMode == PLAYBACK_MODE_WAVE;
-    buttons[1]->setText(wave ? "Wave" : "MIDI");
-    buttons[1]->setIcon(appIcon(wave ? ICON_WAVE : ICON_MIDI));
-    buttons[1]->setToolTip(wave ? "Playback mode: Wave. Click for MIDI." : "Playback mode: MIDI. Click for Wave.");
-    bool detail = displayModes.noteMode == NOTE_MODE_DETAIL;
-    buttons[2]->setText(detail ? "Detail" : "Note");
-    buttons[2]->setIcon(appIcon(detail ? ICON_DETAIL_MODE : ICON_NOTE_MODE));
-    buttons[2]->setToolTip(detail ? "Note mode: Detail. Click for Note." : "Note mode: Note. Click for Detail.");
-    bool chromatic = globalSettings.scaleMode & LAYOUT_CHROMATIC;
-    buttons[3]->setText(chromatic ? "Chromatic" : "Diatonic");
-    buttons[3]->setIcon(appIcon(chromatic ? ICON_CHROMATIC : ICON_DIATONIC));
-    buttons[3]->setToolTip(chromatic ? "Layout: Chromatic. Click for Diatonic." : "Layout: Diatonic. Click for Chromatic.");
+    showModeButtons(buttons[1], buttons[2], buttons[3]);
 
     if (!frameState.songWindowOpen) parts[2]->setText("No song");
     else if (audioActivity.recording) parts[2]->setText("Recording");

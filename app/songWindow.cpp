@@ -85,18 +85,7 @@ void SongWindow::showEvent(QShowEvent* event) {
 }
 
 void SongWindow::refresh() {
-    bool wave = displayModes.playbackMode == PLAYBACK_MODE_WAVE;
-    buttons[0]->setText(wave ? "Wave" : "MIDI");
-    buttons[0]->setIcon(appIcon(wave ? ICON_WAVE : ICON_MIDI));
-    buttons[0]->setToolTip(wave ? "Playback mode: Wave. Click for MIDI." : "Playback mode: MIDI. Click for Wave.");
-    bool detail = displayModes.noteMode == NOTE_MODE_DETAIL;
-    buttons[1]->setText(detail ? "Detail" : "Note");
-    buttons[1]->setIcon(appIcon(detail ? ICON_DETAIL_MODE : ICON_NOTE_MODE));
-    buttons[1]->setToolTip(detail ? "Note mode: Detail. Click for Note." : "Note mode: Note. Click for Detail.");
-    bool chromatic = globalSettings.scaleMode & LAYOUT_CHROMATIC;
-    buttons[2]->setText(chromatic ? "Chromatic" : "Diatonic");
-    buttons[2]->setIcon(appIcon(chromatic ? ICON_CHROMATIC : ICON_DIATONIC));
-    buttons[2]->setToolTip(chromatic ? "Layout: Chromatic. Click for Diatonic." : "Layout: Diatonic. Click for Chromatic.");
+    showModeButtons(buttons[0], buttons[1], buttons[2]);
     buttons[3]->setText(playbackRunning() ? "Stop" : "Play");
     view->songChanged();
     if (meter) meter->update();
