@@ -434,13 +434,7 @@ int analyseLearningFile(const std::string& path, LearningRecording* recording) {
         }
     }
     WaveReadInfo info{};
-    uint32_t code = wioFileOpen(&info, path, 0);
-    if (code == WIO_OPENED) code = checkWaveFileFormat(info);
-    if (code != WIO_OPENED) {
-        if (info.file) wioFileClose(&info);
-        if (code != WIO_DECLINED) showMessage(MESSAGE_ERROR, waveOpenMessage(code));
-        return 0;
-    }
+    if (openCheckedWaveFile(&info, path) != WIO_OPENED) return 0;
     struct CloseWave {
         WaveReadInfo* info;
         ~CloseWave() { wioFileClose(info); }

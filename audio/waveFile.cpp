@@ -168,6 +168,16 @@ uint32_t checkWaveFileFormat(const WaveReadInfo& info) {
     return WIO_OPENED;
 }
 
+uint32_t openCheckedWaveFile(WaveReadInfo* info, const std::string& path) {
+    uint32_t code = wioFileOpen(info, path, 0);
+    if (code == WIO_OPENED) code = checkWaveFileFormat(*info);
+    if (code == WIO_OPENED) return code;
+    if (info->file) wioFileClose(info);
+    // A declined file was the user's own choice; anything else gets the opening message.
+    if (code != WIO_DECLINED) showMessage(MESSAGE_ERROR, waveOpenMessage(code));
+    return code;
+}
+
 std::string waveOpenMessage(uint32_t code) {
     switch (code) {
     case WIO_OPENED:

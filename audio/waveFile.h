@@ -70,6 +70,10 @@ uint32_t checkWaveFileFormat(const WaveReadInfo& info);
 // The text the user reads when a file is refused with code (from wioFileOpen or
 // checkWaveFileFormat); "" for WIO_OPENED.
 std::string waveOpenMessage(uint32_t code);
+// Opens a user's wave file for reading its samples: wioFileOpen, then checkWaveFileFormat.
+// On any code but WIO_OPENED the file is closed and, unless the user declined it at the
+// over-long chunk question, its opening message is shown. Returns the code.
+uint32_t openCheckedWaveFile(WaveReadInfo* info, const std::string& path);
 
 // Reads from the current position of file as many whole frames of format as give
 // outputBytes bytes of one-channel output, each frame reduced to the mean of its channels

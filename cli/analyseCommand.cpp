@@ -114,12 +114,6 @@ static int writePitchCsv(const std::string& path, const std::vector<float>& pitc
     return std::fclose(csv) == 0 && !failed;
 }
 
-static int refuse(WaveReadInfo& info, uint32_t code) {
-    if (info.file) wioFileClose(&info);
-    if (code != WIO_DECLINED) showMessage(MESSAGE_ERROR, waveOpenMessage(code));
-    return 1;
-}
-
 struct AnalyseArguments {
     std::string path, ftCsv, notesCsv, pitchCsv;
     int pitchRange = -1;   // -1: the preference in force
@@ -156,10 +150,7 @@ int runAnalyseCommand(const std::vector<std::string>& arguments) {
         return 2;
     }
     WaveReadInfo info{};
-    uint32_t code = wioFileOpen(&info, a.path, 0);
-    if (code != WIO_OPENED) return refuse(info, code);
-    code = checkWaveFileFormat(info);
-    if (code != WIO_OPENED) return refuse(info, code);
+    if (openCheckedWaveFile(&info, a.path) != WIO_OPENED) return 1;
     if (info.format->samplesPerSec > HIGHEST_SAMPLE_RATE) {
         wioFileClose(&info);
         showMessage(MESSAGE_ERROR, RATE_TOO_HIGH_TEXT);

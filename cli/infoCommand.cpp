@@ -5,7 +5,6 @@
 #include <cstdio>
 
 #include "audio/waveFile.h"
-#include "platform/ui.h"
 
 static const char* formatTagName(uint16_t tag) {
     switch (tag) {
@@ -22,14 +21,7 @@ static const char* formatTagName(uint16_t tag) {
 int runInfoCommand(const std::vector<std::string>& arguments) {
     const std::string& path = arguments[0];
     WaveReadInfo info{};
-    uint32_t code = wioFileOpen(&info, path, 0);
-    if (code == WIO_OPENED) code = checkWaveFileFormat(info);
-    if (code != WIO_OPENED) {
-        if (info.file) wioFileClose(&info);
-        // A declined file was the user's own choice; anything else gets the opening message.
-        if (code != WIO_DECLINED) showMessage(MESSAGE_ERROR, waveOpenMessage(code));
-        return 1;
-    }
+    if (openCheckedWaveFile(&info, path) != WIO_OPENED) return 1;
     const WaveFormatRecord& format = *info.format;
     double duration = format.samplesPerSec ? double(info.dataSamples) / format.samplesPerSec : 0.0;
     std::printf("File: %s\n", path.c_str());

@@ -377,3 +377,22 @@ TEST_F(WaveDownmix, TruncatedFileReadsOnlyToItsEnd) {
 }
 
 }  // namespace
+
+TEST_F(WaveFormatCheck, OpeningACheckedFileRefusesWithTheMessageAndLeavesNothingOpen) {
+    writeFileBytes(path, riffWave({{"fmt ", formatBody(1, 1, 44100, 24)}, {"data", hundredBytes}}));
+    int before = openDescriptors();
+    EXPECT_EQ(openCheckedWaveFile(&info, path), WIO_NOT_PCM);
+    EXPECT_EQ(info.file, nullptr);
+    EXPECT_EQ(openDescriptors(), before);
+    EXPECT_EQ(lastMessageText(), UNSUPPORTED);
+
+    clearUiCalls();
+    writeFileBytes(path, riffWave({{"fmt ", formatBody(1, 1, 8000, 8)}, {"data", hundredBytes, 200}}));
+    presetAnswers({ANSWER_NO});
+    EXPECT_EQ(openCheckedWaveFile(&info, path), WIO_DECLINED);
+    EXPECT_EQ(messageCount(), 1) << "only the question: a declined file gets no second message";
+
+    writeFileBytes(path, pcmWave(1, 8000, 16, hundredBytes));
+    EXPECT_EQ(openCheckedWaveFile(&info, path), WIO_OPENED);
+    EXPECT_NE(info.file, nullptr);
+}
