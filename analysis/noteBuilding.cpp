@@ -211,6 +211,96 @@ static void heldSemitones(uint32_t first, uint32_t end, int* semitones) {
     }
 }
 
+// A run of blocks on one semitone, or (semitone -1) without a pitch.
+struct SemitoneRun {
+    uint32_t from, to;   // blocks
+    int semitone;
+};
+
+static std::vector<SemitoneRun> semitoneRuns(uint32_t first, uint32_t end, const int* semitones) {
+    std::vector<SemitoneRun> runs;
+    for (uint32_t b = first; b < end;) {
+        int s = semitones[b - first];
+        uint32_t to = b + 1;
+        while (to < end && semitones[to - first] == s) to++;
+        runs.push_back(SemitoneRun{b, to, s});
+        b = to;
+    }
+    return runs;
+}
+
+// Whether block b's pitch lies nearer (in semitones) to semitone `to` than to semitone `from`.
+static bool nearerTo(uint32_t b, int from, int to) {
+    double p = blockPitch(b);
+    if (p <= 0.0) return false;
+    double pitch = frequencyToPitch(p);
+    return std::fabs(pitch - to) < std::fabs(pitch - from);
+}
+
+// A move from one note to the next passes through the pitches between them: a singer glides, a
+// slurred instrument bends. The held semitones give such a glide to whichever note the
+// hysteresis or the slivers on the way happen to favour, often its first block, so the next
+// note would start where the voice leaves the note before. Between two notes (runs at least
+// the voice's shortest note long, at most GLIDE_GAP_SECONDS of silence on the way), every block
+// of the way goes to the note whose semitone its pitch lies nearer: the boundary falls where
+// the glide passes the middle, which is where a listener hears the change whether the glide
+// leads into the new note or leaves the old one. Silent blocks in the way join the note on
+// both their sides when both are the same; between the two notes they stay silent.
+static void splitGlides(uint32_t first, uint32_t end, int* semitones, int voice) {
+    std::vector<SemitoneRun> runs = semitoneRuns(first, end, semitones);
+    uint32_t gapLimit = uint32_t(std::max(1, blocksForSeconds(GLIDE_GAP_SECONDS)));
+    auto isNote = [voice](const SemitoneRun& r) {
+        return r.semitone >= 0 && songTimeOfBlock(r.to, r.from) >= shortestNoteSeconds(voice, r.semitone);
+    };
+    for (size_t i = 0; i < runs.size(); i++) {
+        if (!isNote(runs[i])) continue;
+        // The next note after runs[i], through slivers and short silences only.
+        size_t j = i + 1;
+        bool broken = false;
+        while (j < runs.size() && !isNote(runs[j])) {
+            const SemitoneRun& r = runs[j];
+            if (r.semitone < 0 && r.to - r.from > gapLimit) broken = true;
+            j++;
+        }
+        if (broken || j >= runs.size()) continue;
+        const SemitoneRun& before = runs[i];
+        const SemitoneRun& after = runs[j];
+        int a = before.semitone, c = after.semitone;
+        if (a == c) {
+            // A wobble inside one note, or a re-attack the syllable splits will find.
+            if (j == i + 1) continue;
+            bool pitched = true;
+            for (size_t k = i + 1; k < j; k++) pitched = pitched && runs[k].semitone >= 0;
+            if (!pitched) continue;   // a silence between two notes on one semitone parts them
+            for (uint32_t b = before.to; b < after.from; b++) semitones[b - first] = a;
+            continue;
+        }
+        // The way from the old note's last blocks that already lean towards the new one (the
+        // hysteresis kept them) to the new note's first block.
+        uint32_t reach = uint32_t(std::max(1, blocksForSeconds(GLIDE_REACH_SECONDS)));
+        uint32_t wayFrom = before.to;
+        while (wayFrom > before.from + 1 && before.to - wayFrom < reach && nearerTo(wayFrom - 1, a, c)) wayFrom--;
+        uint32_t wayTo = after.from;
+        if (wayFrom == wayTo) continue;
+        // The boundary: the first block of the way from which no pitched block is nearer the old note.
+        uint32_t boundary = wayTo;
+        while (boundary > wayFrom) {
+            uint32_t b = boundary - 1;
+            if (blockPitch(b) > 0.0 && !nearerTo(b, a, c)) break;
+            boundary--;
+        }
+        // Silent blocks right at the boundary stay silent: the old note ended there.
+        while (boundary < wayTo && blockPitch(boundary) <= 0.0) boundary++;
+        uint32_t oldEnd = boundary;
+        while (oldEnd > wayFrom && blockPitch(oldEnd - 1) <= 0.0) oldEnd--;
+        for (uint32_t b = wayFrom; b < wayTo; b++) {
+            int s = b < oldEnd ? a : b >= boundary ? c : -1;
+            semitones[b - first] = s;
+        }
+        runs[j].from = boundary;
+    }
+}
+
 // Runs of one semitone shorter than the voice's shortest note are slivers of a transition or
 // a wobble: one between two runs of the same semitone joins them, else one right before a
 // run within two semitones becomes that note's start (a scoop or the attack of the next
@@ -284,11 +374,16 @@ static void advanceOnset(NoteCandidate& c, NoteCandidate* before, uint32_t first
                 largest = std::max<int>(largest, data.entries[i].amplitude);
         return largest;
     };
+    // The partial's level early in the note: what it rises from below a fraction of that is
+    // breath or noise before the note, not its start.
+    int early = 0;
+    uint32_t earlyEnd = std::min(c.end, c.first + uint32_t(std::max(1, blocksForSeconds(ONSET_LEVEL_SECONDS))));
+    for (uint32_t b = c.first; b < earlyEnd; b++) early = std::max(early, partial(b));
     uint32_t start = c.first;
     int next = partial(start);
     while (start > limit) {
         int a = partial(start - 1);
-        if (a == 0 || a > next || (before && start - 1 < before->first)) break;
+        if (a == 0 || a > next || a * ONSET_RISE_FLOOR < early || (before && start - 1 < before->first)) break;
         next = a;
         start--;
     }
@@ -333,12 +428,19 @@ uint32_t buildNotes(uint32_t fromSample, int notesToDrop) {
     }
 
     // Runs on one semitone, semitone by semitone from the lowest present.
-    std::vector<int> semitones(end - first);
-    heldSemitones(first, end, semitones.data());
-    absorbSlivers(first, end, semitones.data(), voiceOf(songDefinition(songInstruments.settledVoice)));
+    // The semitones are decided from a little before the first block on: the note that ends
+    // there (built by an earlier call) decides where a glide out of it is split.
+    uint32_t reachBack = uint32_t(std::max(1, blocksForSeconds(GLIDE_CONTEXT_SECONDS)));
+    uint32_t context = first - w.firstBlock > reachBack ? first - reachBack : w.firstBlock;
+    std::vector<int> contextSemitones(end - context);
+    int voice = voiceOf(songDefinition(songInstruments.settledVoice));
+    heldSemitones(context, end, contextSemitones.data());
+    splitGlides(context, end, contextSemitones.data(), voice);
+    absorbSlivers(context, end, contextSemitones.data(), voice);
+    const int* semitones = contextSemitones.data() + (first - context);
     int lowest = 256, highest = -1;
-    for (int s : semitones)
-        if (s >= 0) lowest = std::min(lowest, s), highest = std::max(highest, s);
+    for (uint32_t b = first; b < end; b++)
+        if (semitones[b - first] >= 0) lowest = std::min(lowest, semitones[b - first]), highest = std::max(highest, semitones[b - first]);
     std::vector<NoteCandidate> candidates;
     for (int s = lowest; s <= highest; s++) {
         for (uint32_t b = first; b < end;) {

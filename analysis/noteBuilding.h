@@ -13,9 +13,20 @@ constexpr int VOICE_OOHS_VOICE = 53;   // the voice when no instrument definitio
 // A block keeps the semitone the block before held while its pitch stays within half a
 // semitone and this much of it.
 constexpr double SEMITONE_HYSTERESIS = 0.3;
+// A glide between two notes is split where it passes the middle when the notes lie at most
+// this much of silence apart, and the split may take back this much of the old note's end
+// that already leans towards the new one, seconds.
+constexpr double GLIDE_GAP_SECONDS = 0.06;
+constexpr double GLIDE_REACH_SECONDS = 0.06;
+// Note building decides the semitones from this long before its first block, seconds.
+constexpr double GLIDE_CONTEXT_SECONDS = 0.3;
 // A note starts where its partial began to rise, at most this much before the pitch track
 // takes it, seconds.
 constexpr double ONSET_ADVANCE_SECONDS = 0.08;
+// ... from no lower than the partial's largest amplitude over the note's first
+// ONSET_LEVEL_SECONDS divided by ONSET_RISE_FLOOR.
+constexpr double ONSET_LEVEL_SECONDS = 0.05;
+constexpr int ONSET_RISE_FLOOR = 8;
 
 struct SongInstruments {
     int definitions[MAX_SONG_INSTRUMENTS];   // InstrumentDefinition index of each slot (-1: the built-in voice)

@@ -81,6 +81,74 @@ TEST_F(NoteBuilding, ASliverBetweenTwoRunsOfOneSemitoneJoinsThem) {
     EXPECT_NEAR(noteList.notes[0].pitch, 220.0, 0.01) << "the sliver does not pull the pitch";
 }
 
+// A glide from 57 (blocks 40..47) up to 64: 57.78, 58.56, 59.33, 60.11, 60.89, ... 63.22.
+static double glideUp(uint32_t b) { return 57.0 + 7.0 * (double(b) - 39.0) / 9.0; }
+
+TEST_F(NoteBuilding, AGlideBetweenTwoNotesIsSplitWhereItPassesTheMiddle) {
+    makeSong(90);
+    setPitches(10, 40, pitchToFrequency(57));
+    for (uint32_t b = 40; b < 48; b++) setPitch(b, pitchToFrequency(glideUp(b)));
+    setPitches(48, 80, pitchToFrequency(64));
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 2);
+    EXPECT_EQ(noteList.notes[0].midiNote, 57);
+    EXPECT_EQ(noteList.notes[1].midiNote, 64);
+    EXPECT_NEAR(noteList.notes[0].waveEnd, blockTime(44), 1e-6) << "60.11 lies nearer 57";
+    EXPECT_NEAR(noteList.notes[1].waveStart, blockTime(44), 1e-6) << "60.89 lies nearer 64";
+    EXPECT_NEAR(noteList.notes[1].waveEnd, blockTime(80), 1e-6);
+
+    // Rebuilt from the second note on, as the opening path does after the next chunk: the
+    // first note (built before) still decides where the glide is split.
+    buildNotes(sampleOf(44), 1);
+    ASSERT_EQ(noteList.count, 2);
+    EXPECT_NEAR(noteList.notes[1].waveStart, blockTime(44), 1e-6);
+    EXPECT_EQ(noteList.notes[1].midiNote, 64);
+}
+
+TEST_F(NoteBuilding, AShortSilenceAfterAGlideBelongsToTheNoteTheGlideReached) {
+    makeSong(90);
+    setPitches(10, 40, pitchToFrequency(57));
+    const double way[] = {58.5, 60.0, 61.5, 63.0};
+    for (uint32_t b = 40; b < 44; b++) setPitch(b, pitchToFrequency(way[b - 40]));
+    // Blocks 44..47 (0.046 s) hold nothing: the consonant of the next syllable.
+    setPitches(48, 80, pitchToFrequency(64));
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 2);
+    EXPECT_NEAR(noteList.notes[0].waveEnd, blockTime(42), 1e-6);
+    EXPECT_NEAR(noteList.notes[1].waveStart, blockTime(42), 1e-6) << "61.5 lies nearer 64; the silence joins it";
+}
+
+TEST_F(NoteBuilding, ALongSilenceKeepsTwoNotesApart) {
+    makeSong(100);
+    setPitches(10, 40, pitchToFrequency(57));
+    setPitches(40, 42, pitchToFrequency(61.5));   // a sliver leaning towards the next note
+    // Blocks 42..49 (0.093 s) are silent: longer than a glide's gap.
+    setPitches(50, 80, pitchToFrequency(64));
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 2);
+    EXPECT_NEAR(noteList.notes[1].waveStart, blockTime(50), 1e-6);
+}
+
+TEST_F(NoteBuilding, ANoteStartsWhereItsPartialRoseButNotInTheFaintNoiseBeforeIt) {
+    makeSong(90);
+    // The track takes the note at block 20; its partial was there, rising, from block 16.
+    setBlocks(20, 60, {{220.0, 200}}, 200);
+    for (uint32_t b = 16; b < 20; b++) setBlock(b, {{220.0, int(40 * (b - 15))}}, 100);
+    setPitches(16, 20, 0.0);
+    setPitches(20, 60, 220.0);
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 1);
+    EXPECT_NEAR(noteList.notes[0].waveStart, blockTime(16), 1e-6);
+
+    // A partial at 5 % of the note's level is breath before it, not its start.
+    resetNoteList();
+    setBlocks(14, 20, {{220.0, 10}}, 20);
+    setPitches(14, 20, 0.0);
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 1);
+    EXPECT_NEAR(noteList.notes[0].waveStart, blockTime(20), 1e-6);
+}
+
 TEST_F(NoteBuilding, ANoteSplitsAtASyllableStartWellInsideIt) {
     makeSong(120);
     setPitches(0, 100, 220.0, 100);
