@@ -62,8 +62,14 @@ static void dipStarts(const SyllableCues& c, std::vector<size_t>& starts) {
         double before = 0.0, after = 0.0;
         for (size_t k = r > reach ? r - reach : 0; k < r; k++) before = std::max(before, smooth[k]);
         for (size_t k = r + 1; k < n && k <= r + reach; k++) after = std::max(after, smooth[k]);
-        if (before >= loud && after >= loud && before >= DIP_DEPTH * smooth[r] && after >= DIP_DEPTH * smooth[r])
-            starts.push_back(r);
+        if (!(before >= loud && after >= loud && before >= DIP_DEPTH * smooth[r] && after >= DIP_DEPTH * smooth[r]))
+            continue;
+        // The syllable starts where the voice let go, not at the quietest point: the first row
+        // of the fall below the middle (in level) of the loudness before and the valley.
+        double middle = std::sqrt(before * smooth[r]);
+        size_t start = r;
+        while (start > 0 && r - start < reach && smooth[start - 1] < middle) start--;
+        starts.push_back(start);
     }
 }
 

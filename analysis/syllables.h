@@ -14,10 +14,13 @@ constexpr double SYLLABLE_ESTIMATE_SECONDS = 0.02;      // the fundamental estim
 constexpr double SYLLABLE_DEFAULT_PITCH_HZ = 200.0;     // estimate before any pitch is known
 constexpr float SYLLABLE_SPIKE_THRESHOLD = 0.6666667f;  // the robust maximum of the row totals
 // Energy dips: a valley of the row totals (smoothed over three rows) whose loudness on both
-// sides, within DIP_REACH_SECONDS, is at least DIP_DEPTH times the valley and at least
-// DIP_MIN_LEVEL of the robust maximum starts a syllable at the valley.
+// sides, within DIP_REACH_SECONDS, is at least DIP_DEPTH times the valley (6 dB: a voiced
+// consonant such as l, m or n between two vowels, or a re-attacked note) and at least
+// DIP_MIN_LEVEL of the robust maximum starts a syllable where the loudness fell through the
+// middle (in level) between the loudness before and the valley: the singer starts the new
+// syllable as the old vowel ends, not at the quietest point of the consonant.
 constexpr double DIP_REACH_SECONDS = 0.15;
-constexpr double DIP_DEPTH = 3.0;
+constexpr double DIP_DEPTH = 2.0;
 constexpr double DIP_MIN_LEVEL = 0.1;
 // Consonants ("CS Detect syllables"): a peak of the brightness ratio of at least 0.3, reached
 // from a ratio 0.1 lower within 0.2 s before it (or 0.07 lower after a stretch flat to within

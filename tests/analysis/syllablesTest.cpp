@@ -23,8 +23,8 @@ TEST_F(SyllableStarts, ADeepLoudnessDipBetweenTwoLoudStretchesStartsASyllable) {
     findSyllables(0, BLOCKS);
     ASSERT_EQ(syllables.startBlocks.size(), 1u);
     uint32_t start = syllables.startBlocks[0];
-    EXPECT_GE(start, 100u);
-    EXPECT_LE(start, 104u);
+    EXPECT_GE(start, 99u);
+    EXPECT_LE(start, 100u) << "the syllable starts where the loudness fell, not at the valley's quietest row";
     EXPECT_TRUE(blockData(start).blockFlags & BLOCK_SYLLABLE_START);
     EXPECT_TRUE(blockOrigData(start).blockFlags & BLOCK_SYLLABLE_START);
     int marked = 0;
@@ -35,16 +35,17 @@ TEST_F(SyllableStarts, ADeepLoudnessDipBetweenTwoLoudStretchesStartsASyllable) {
 TEST_F(SyllableStarts, AShallowDipIsNoSyllable) {
     makeSong(BLOCKS);
     setPitches(0, BLOCKS, 200.0);
-    makeRows(2 * BLOCKS, [&](uint32_t r, uint32_t* row) { voicedRow(row, r >= 200 && r < 208 ? 50000u : 100000u, 1000); });
+    makeRows(2 * BLOCKS, [&](uint32_t r, uint32_t* row) { voicedRow(row, r >= 200 && r < 208 ? 60000u : 100000u, 1000); });
     findSyllables(0, BLOCKS);
     EXPECT_TRUE(syllables.startBlocks.empty());
 }
 
 TEST_F(SyllableStarts, AConsonantStartsASyllableOnlyWithDetectSyllablesOn) {
-    // The rows around 200 brighten (share above the split from 0.01 to 0.6) and lose loudness
-    // to 0.45 of the vowels: not deep enough for a dip, a consonant all the same.
+    // Two rows before 200 brighten (share above the split from 0.01 to 0.6) and lose loudness
+    // to 0.45 of the vowels: too short a valley for a dip once the totals are smoothed over
+    // three rows, a consonant all the same.
     auto consonant = [&](uint32_t r, uint32_t* row) {
-        bool inside = r >= 198 && r < 204;
+        bool inside = r >= 198 && r < 200;
         voicedRow(row, inside ? 18000u : 100000u, inside ? 27000u : 1000u);
     };
     makeSong(BLOCKS);
