@@ -23,8 +23,8 @@ constexpr double GLIDE_CONTEXT_SECONDS = 0.3;
 // A note starts where its partial began to rise, at most this much before the pitch track
 // takes it, seconds.
 constexpr double ONSET_ADVANCE_SECONDS = 0.08;
-// ... from no lower than the partial's largest amplitude over the note's first
-// ONSET_LEVEL_SECONDS divided by ONSET_RISE_FLOOR.
+// The rise counts from the partial's largest amplitude over the note's first
+// ONSET_LEVEL_SECONDS divided by ONSET_RISE_FLOOR upwards: anything fainter is breath or noise.
 constexpr double ONSET_LEVEL_SECONDS = 0.05;
 constexpr int ONSET_RISE_FLOOR = 8;
 
