@@ -29,12 +29,37 @@ double brightnessRatio(const uint32_t* magnitudes, uint32_t count, double binWid
     return ratio;
 }
 
+std::vector<double> rowColour(const uint32_t* magnitudes, uint32_t count, double binWidth, double* loudness) {
+    std::vector<double> sums(VOWEL_BANDS, 0.0);
+    double bandsPerOctave = 3.0;
+    for (uint32_t i = 0; i < count; i++) {
+        double f = (i + 1) * binWidth;
+        if (f < VOWEL_LOWEST_BAND_HZ) continue;
+        int band = int(std::floor(bandsPerOctave * std::log2(f / VOWEL_LOWEST_BAND_HZ)));
+        if (band >= VOWEL_BANDS) break;
+        sums[size_t(band)] += magnitudes[i];
+    }
+    std::vector<double> colour(VOWEL_BANDS);
+    double mean = 0.0, power = 0.0;
+    for (int k = 0; k < VOWEL_BANDS; k++) {
+        colour[size_t(k)] = 20.0 * std::log10(sums[size_t(k)] + 1.0);
+        mean += colour[size_t(k)];
+        power += (sums[size_t(k)] + 1.0) * (sums[size_t(k)] + 1.0);
+    }
+    mean /= VOWEL_BANDS;
+    for (double& c : colour) c -= mean;
+    if (loudness) *loudness = 10.0 * std::log10(power);
+    return colour;
+}
+
 // Rows of the spectrogram from row 0 of the cues: first row, their block (or -1), totals and ratios.
 struct SyllableCues {
     uint32_t firstRow;
     std::vector<int> blockOfRow;     // song block whose middle lies in the row's hop, -1 when none
     std::vector<double> totals;      // magnitudes from the fourth bin up
     std::vector<double> ratios;      // brightness ratios
+    std::vector<std::vector<double>> colours;   // rowColour of each row
+    std::vector<double> levels;      // each row's level over the colour bands, dB
 };
 
 static void dipStarts(const SyllableCues& c, std::vector<size_t>& starts) {
@@ -70,6 +95,40 @@ static void dipStarts(const SyllableCues& c, std::vector<size_t>& starts) {
         size_t start = r;
         while (start > 0 && r - start < reach && smooth[start - 1] < middle) start--;
         starts.push_back(start);
+    }
+}
+
+static void vowelChangeStarts(const SyllableCues& c, std::vector<size_t>& starts) {
+    size_t n = c.colours.size();
+    double rowSeconds = double(magnitudeSpectrogram.hop) / song.waveFormat.samplesPerSec;
+    size_t side = std::max<size_t>(1, size_t(VOWEL_SIDE_SECONDS / rowSeconds + 0.5));
+    if (n < 2 * side + 2) return;
+    double loudest = *std::max_element(c.levels.begin(), c.levels.end());
+    // Running sums of the colours make every side's mean one subtraction.
+    std::vector<std::vector<double>> running(n + 1, std::vector<double>(VOWEL_BANDS, 0.0));
+    for (size_t r = 0; r < n; r++)
+        for (int k = 0; k < VOWEL_BANDS; k++) running[r + 1][size_t(k)] = running[r][size_t(k)] + c.colours[r][size_t(k)];
+    std::vector<double> change(n, 0.0);
+    for (size_t r = side; r + side <= n; r++) {
+        double sum = 0.0;
+        for (int k = 0; k < VOWEL_BANDS; k++) {
+            size_t b = size_t(k);
+            double before = (running[r][b] - running[r - side][b]) / double(side);
+            double after = (running[r + side][b] - running[r][b]) / double(side);
+            sum += std::fabs(after - before);
+        }
+        change[r] = sum / VOWEL_BANDS;
+    }
+    for (size_t r = side + 1; r + side < n; r++) {
+        if (change[r] < VOWEL_CHANGE_DB || change[r] < change[r - 1] || change[r] <= change[r + 1]) continue;
+        // Only where the voice sounds: within the dip rule's reach of the loudest row's level.
+        if (c.levels[r] < loudest + 20.0 * std::log10(DIP_MIN_LEVEL)) continue;
+        double before = -1e300, after = -1e300, valley = 1e300;
+        for (size_t k = r - side; k < r; k++) before = std::max(before, c.levels[k]);
+        for (size_t k = r; k < r + side; k++) after = std::max(after, c.levels[k]);
+        for (size_t k = r - 2; k <= r + 2 && k < n; k++) valley = std::min(valley, c.levels[k]);
+        if (std::min(before, after) - valley < VOWEL_DIP_DB) continue;
+        starts.push_back(r);
     }
 }
 
@@ -163,6 +222,8 @@ void findSyllables(uint32_t from, uint32_t end) {
     size_t n = c.blockOfRow.size();
     c.totals.resize(n);
     c.ratios.resize(n);
+    c.colours.resize(n);
+    c.levels.resize(n);
     uint32_t refresh = std::max(1u, uint32_t(SYLLABLE_ESTIMATE_SECONDS / rowSeconds + 0.5));
     double estimate = SYLLABLE_DEFAULT_PITCH_HZ;
     for (uint32_t b = from; b < end; b++)
@@ -181,11 +242,15 @@ void findSyllables(uint32_t from, uint32_t end) {
             sinceRefresh = 0;
         }
         c.ratios[k] = brightnessRatio(row, s.binsPerRow, s.binWidth, estimate);
+        c.colours[k] = rowColour(row, s.binsPerRow, s.binWidth, &c.levels[k]);
     }
 
     std::vector<size_t> starts;
     dipStarts(c, starts);
-    if (generalSettings.detectSyllables) consonantStarts(c, starts);
+    if (generalSettings.detectSyllables) {
+        consonantStarts(c, starts);
+        vowelChangeStarts(c, starts);
+    }
     std::sort(starts.begin(), starts.end());
     uint32_t spacing = uint32_t(std::max(1, blocksForSeconds(SYLLABLE_MIN_SPACING_SECONDS)));
     for (size_t r : starts) {

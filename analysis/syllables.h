@@ -36,6 +36,19 @@ constexpr double CONSONANT_REACH_SECONDS = 0.2;
 // CONSONANT_LOUDNESS_SECONDS of it.
 constexpr double CONSONANT_QUIETER = 0.5;
 constexpr double CONSONANT_LOUDNESS_SECONDS = 0.1;
+// Vowel changes ("CS Detect syllables"): a voiced consonant (l, m, n) between two vowels barely
+// dips the loudness, but the vowels on its two sides differ. Each row's spectrum is summed
+// into third-octave bands from VOWEL_LOWEST_BAND_HZ up (VOWEL_BANDS of them) and taken in dB
+// relative to the row's mean band level: the row's colour. A row where the mean colour over
+// VOWEL_SIDE_SECONDS after it differs from the mean colour over as long before it by at least
+// VOWEL_CHANGE_DB (averaged over the bands), more than at the rows beside it, while the
+// loudness there lies at least VOWEL_DIP_DB below the loudest row on each side, starts a
+// syllable.
+constexpr double VOWEL_LOWEST_BAND_HZ = 150.0;
+constexpr int VOWEL_BANDS = 15;
+constexpr double VOWEL_SIDE_SECONDS = 0.05;
+constexpr double VOWEL_CHANGE_DB = 5.0;
+constexpr double VOWEL_DIP_DB = 1.0;
 // Two syllable starts are at least this far apart; the earlier one stands.
 constexpr double SYLLABLE_MIN_SPACING_SECONDS = 0.1;
 
@@ -56,3 +69,7 @@ void releaseSyllables();
 // nothing lies below, divided by fundamental / 524 when fundamental is 524 Hz or more. The
 // first three magnitudes are left out; magnitude i lies at (i + 1) x binWidth Hz.
 double brightnessRatio(const uint32_t* magnitudes, uint32_t count, double binWidth, double fundamental);
+// One row's colour: its level in each of the VOWEL_BANDS third-octave bands, dB (20 log10 of the
+// band's summed magnitude + 1), less the mean of those levels; *loudness (when given) gets the
+// row's level over all the bands, dB.
+std::vector<double> rowColour(const uint32_t* magnitudes, uint32_t count, double binWidth, double* loudness = nullptr);

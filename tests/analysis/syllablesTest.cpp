@@ -63,6 +63,51 @@ TEST_F(SyllableStarts, AConsonantStartsASyllableOnlyWithDetectSyllablesOn) {
     EXPECT_FALSE(blockData(102).blockFlags & BLOCK_SYLLABLE_START) << "the earlier start is cleared";
 }
 
+TEST_F(SyllableStarts, AVowelChangeAcrossAShallowDipStartsASyllableOnlyWithDetectSyllablesOn) {
+    // "la" then "lee" on one pitch: the second formant moves from 700 Hz to 2500 Hz at row 200,
+    // and the l between them takes 3 dB off rows 198 .. 201, far less than a dip needs.
+    auto vowels = [&](bool dip) {
+        return [&, dip](uint32_t r, uint32_t* row) {
+            double scale = dip && r >= 198 && r < 202 ? 0.7 : 1.0;
+            row[binOf(300.0)] = uint32_t(100000 * scale);
+            row[binOf(r < 200 ? 700.0 : 2500.0)] = uint32_t(50000 * scale);
+        };
+    };
+    makeSong(BLOCKS);
+    setPitches(0, BLOCKS, 150.0);
+    makeRows(2 * BLOCKS, vowels(true));
+    generalSettings.detectSyllables = true;
+    findSyllables(0, BLOCKS);
+    ASSERT_EQ(syllables.startBlocks.size(), 1u);
+    EXPECT_EQ(syllables.startBlocks[0], 100u);
+
+    generalSettings.detectSyllables = false;
+    findSyllables(0, BLOCKS);
+    EXPECT_TRUE(syllables.startBlocks.empty()) << "the dip alone is too shallow";
+
+    // The same change without the consonant's dip: a diphthong, not a new syllable.
+    generalSettings.detectSyllables = true;
+    makeRows(2 * BLOCKS, vowels(false));
+    findSyllables(0, BLOCKS);
+    EXPECT_TRUE(syllables.startBlocks.empty());
+}
+
+TEST_F(SyllableStarts, ARowsColourIsItsThirdOctaveLevelsAboutTheirMean) {
+    makeSong(10);
+    std::vector<uint32_t> row(magnitudeSpectrogram.binsPerRow, 0u);
+    row[binOf(160.0)] = 999;     // band 0 (150 .. 189 Hz)
+    row[binOf(4700.0)] = 9999;   // band 14 (4762 Hz and up lies beyond it)
+    row[binOf(100.0)] = 50000;   // below the lowest band: not counted
+    double loudness = 0.0;
+    std::vector<double> colour = rowColour(row.data(), uint32_t(row.size()), magnitudeSpectrogram.binWidth, &loudness);
+    ASSERT_EQ(colour.size(), size_t(VOWEL_BANDS));
+    double mean = (60.0 + 80.0) / VOWEL_BANDS;   // 20 log10(1000) and 20 log10(10000); empty bands are 0 dB
+    EXPECT_NEAR(colour[0], 60.0 - mean, 1e-9);
+    EXPECT_NEAR(colour[14], 80.0 - mean, 1e-9);
+    EXPECT_NEAR(colour[7], -mean, 1e-9);
+    EXPECT_NEAR(loudness, 10.0 * std::log10(1000.0 * 1000.0 + 10000.0 * 10000.0 + 13.0), 1e-9);
+}
+
 TEST_F(SyllableStarts, BlocksTheSpectrogramNoLongerCoversKeepTheirStarts) {
     makeSong(BLOCKS);
     setPitches(0, BLOCKS, 200.0);
