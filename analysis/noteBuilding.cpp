@@ -392,6 +392,44 @@ static void advanceOnset(NoteCandidate& c, NoteCandidate* before, uint32_t first
     c.first = start;
 }
 
+// A sung note follows the one before through a consonant: the voice glides to the new pitch
+// into it, so the pitch track changes a little before the syllable starts. A boundary between
+// two notes on different semitones moves forward to a syllable start at most
+// SYLLABLE_SNAP_SECONDS after it, as long as the new note keeps SNAP_KEEP_SECONDS.
+static void snapToSyllables(std::vector<NoteCandidate>& candidates) {
+    uint32_t reach = uint32_t(std::max(1, blocksForSeconds(SYLLABLE_SNAP_SECONDS)));
+    uint32_t keep = uint32_t(std::max(1, blocksForSeconds(SNAP_KEEP_SECONDS)));
+    for (size_t i = 1; i < candidates.size(); i++) {
+        NoteCandidate& before = candidates[i - 1];
+        NoteCandidate& c = candidates[i];
+        if (c.first != before.end || c.semitone == before.semitone) continue;
+        uint32_t hi = std::min(c.first + reach, c.end > keep ? c.end - keep : 0);
+        for (uint32_t b = c.first + 1; b <= hi; b++) {
+            if (!(blockData(b).blockFlags & BLOCK_SYLLABLE_START)) continue;
+            before.end = c.first = b;
+            break;
+        }
+    }
+}
+
+// A note out of silence (no pitch for SNAP_KEEP_SECONDS before it) may begin with a few faint
+// blocks on its pitch: breath, the hum of a nasal before the vowel, noise the analysis found
+// the pitch in. Its start is where the track's amplitude first reaches 1/FAINT_START_RATIO of
+// its largest over the note's first FAINT_START_SECONDS.
+static void trimFaintStart(NoteCandidate& c, uint32_t windowFirst) {
+    // Only after silence: a note that follows another, even across a short dropout, keeps its start.
+    uint32_t silence = uint32_t(std::max(1, blocksForSeconds(SNAP_KEEP_SECONDS)));
+    for (uint32_t b = c.first; b > windowFirst && c.first - b < silence; b--)
+        if (blockPitch(b - 1) > 0.0) return;
+    auto amplitude = [](uint32_t b) { return blockData(b).nEntries ? int(blockData(b).entries[0].amplitude) : 0; };
+    uint32_t span = uint32_t(std::max(1, blocksForSeconds(FAINT_START_SECONDS)));
+    uint32_t spanEnd = std::min(c.end, c.first + span);
+    int largest = 0;
+    for (uint32_t b = c.first; b < spanEnd; b++) largest = std::max(largest, amplitude(b));
+    uint32_t keep = uint32_t(std::max(1, blocksForSeconds(SNAP_KEEP_SECONDS)));
+    while (c.first + keep < c.end && amplitude(c.first) * FAINT_START_RATIO < largest) c.first++;
+}
+
 static void measureCandidate(NoteCandidate& c) {
     c.volumeSum = 0;
     c.largest = 0;
@@ -457,8 +495,10 @@ uint32_t buildNotes(uint32_t fromSample, int notesToDrop) {
     std::sort(candidates.begin(), candidates.end(),
               [](const NoteCandidate& a, const NoteCandidate& b) { return a.first < b.first; });
     for (NoteCandidate& c : candidates) c.pitch = notePitch(c.first, c.end, semitoneMean(c));
+    for (NoteCandidate& c : candidates) trimFaintStart(c, w.firstBlock);
     for (size_t i = 0; i < candidates.size(); i++)
         advanceOnset(candidates[i], i > 0 ? &candidates[i - 1] : nullptr, first);
+    if (recognitionOptions.monophonicRecognition && recognitionOptions.findSyllables) snapToSyllables(candidates);
     for (NoteCandidate& c : candidates) measureCandidate(c);
 
     // Block start times of [first, end], walked once.

@@ -20,6 +20,14 @@ constexpr double GLIDE_GAP_SECONDS = 0.06;
 constexpr double GLIDE_REACH_SECONDS = 0.06;
 // Note building decides the semitones from this long before its first block, seconds.
 constexpr double GLIDE_CONTEXT_SECONDS = 0.3;
+// A boundary between two notes moves forward to a syllable start at most this far after it,
+// seconds, while the new note keeps at least SNAP_KEEP_SECONDS.
+constexpr double SYLLABLE_SNAP_SECONDS = 0.08;
+constexpr double SNAP_KEEP_SECONDS = 0.05;
+// A note out of silence starts where the track's amplitude first reaches 1/FAINT_START_RATIO
+// of its largest over the note's first FAINT_START_SECONDS.
+constexpr double FAINT_START_SECONDS = 0.1;
+constexpr int FAINT_START_RATIO = 8;
 // A note starts where its partial began to rise, at most this much before the pitch track
 // takes it, seconds.
 constexpr double ONSET_ADVANCE_SECONDS = 0.08;

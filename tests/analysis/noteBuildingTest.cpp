@@ -149,6 +149,42 @@ TEST_F(NoteBuilding, ANoteStartsWhereItsPartialRoseButNotInTheFaintNoiseBeforeIt
     EXPECT_NEAR(noteList.notes[0].waveStart, blockTime(20), 1e-6);
 }
 
+TEST_F(NoteBuilding, ABoundaryMovesForwardToASyllableStartJustAfterIt) {
+    makeSong(100);
+    setPitches(10, 40, pitchToFrequency(57));
+    setPitches(40, 80, pitchToFrequency(64));
+    blockData(46).blockFlags |= BLOCK_SYLLABLE_START;   // 0.07 s into the second note
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 2);
+    EXPECT_NEAR(noteList.notes[0].waveEnd, blockTime(46), 1e-6);
+    EXPECT_NEAR(noteList.notes[1].waveStart, blockTime(46), 1e-6);
+    EXPECT_EQ(noteList.notes[1].midiNote, 64);
+
+    // Further on (0.093 s) it is the new note's business, and the boundary stays.
+    resetNoteList();
+    blockData(46).blockFlags = 0;
+    blockData(48).blockFlags |= BLOCK_SYLLABLE_START;
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 2);
+    EXPECT_NEAR(noteList.notes[1].waveStart, blockTime(40), 1e-6);
+}
+
+TEST_F(NoteBuilding, AFaintStartOutOfSilenceIsLeftOut) {
+    makeSong(100);
+    setPitches(20, 23, 220.0, 10);
+    setPitches(23, 60, 220.0, 200);
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 1);
+    EXPECT_NEAR(noteList.notes[0].waveStart, blockTime(23), 1e-6);
+
+    // After another note and a one-block dropout the quiet blocks are the new note's attack.
+    resetNoteList();
+    setPitches(5, 19, 330.0, 200);
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 2);
+    EXPECT_NEAR(noteList.notes[1].waveStart, blockTime(20), 1e-6);
+}
+
 TEST_F(NoteBuilding, ANoteSplitsAtASyllableStartWellInsideIt) {
     makeSong(120);
     setPitches(0, 100, 220.0, 100);
