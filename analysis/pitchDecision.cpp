@@ -220,6 +220,25 @@ static int chooseFundamental(uint32_t block, uint32_t endBlock, bool useRange, i
     return best >= 0 ? int(candidates[best].entry) : -1;
 }
 
+// One partial often lights two neighbouring pitch bins, the weaker with its frequency pulled
+// towards its own bin. The candidates are visited from the lowest up, so the weaker lower
+// bin can win the choice; the partial's frequency is its stronger bin's. From the chosen entry
+// this climbs to the loudest entry of its partial: neighbours within a semitone of each other,
+// each louder than the one before.
+static int peakOfPartial(const FTDataBuffer& data, int chosen) {
+    for (int direction : {1, -1}) {
+        for (int i = chosen + direction; i >= 0 && i < int(data.nEntries); i += direction) {
+            const FrequencyEntry& e = data.entries[i];
+            const FrequencyEntry& previous = data.entries[i - direction];
+            if (!nearFrequency(e.frequency, previous.frequency, SEMITONE_TOLERANCE) || isHumFrequency(e.frequency) ||
+                e.amplitude <= previous.amplitude)
+                break;
+            chosen = i;
+        }
+    }
+    return chosen;
+}
+
 // The band of the chosen entry, grown over its neighbours of the same partial.
 static BlockBand growBand(uint32_t block, int chosen) {
     const FTDataBuffer& data = blockOrigData(block);
@@ -346,6 +365,7 @@ void decideBlockPitches(const RecognitionPass& pass) {
         // next: a faint entry that holds on ahead still decides the block, and the cleaning
         // passes drop what stays weak.
         if (chosen < 0) chosen = chooseFundamental(b, end, useRange, low, high, &skipped, true);
+        if (chosen >= 0) chosen = peakOfPartial(blockOrigData(b), chosen);
         if (chosen >= 0) bands[b - first] = growBand(b, chosen);
         addReference(reference, chosen >= 0 ? frequencyToSemitone(blockOrigData(b).entries[chosen].frequency) : -1);
     }

@@ -26,6 +26,17 @@ TEST_F(PitchDecision, MergedPitchIsTheAmplitudeWeightedMeanOfTheBand) {
     EXPECT_EQ(data.entries[0].cutOffLevel, TEST_CUT_OFF);
 }
 
+TEST_F(PitchDecision, APartialSplitOverTwoBinsIsCentredOnItsStrongerBin) {
+    // A partial at 400 Hz lights its own bin (400.0 Hz, 185) and the bin below with a pulled
+    // frequency (385.0 Hz, 103, 66 cents lower); the lower bin is visited first.
+    makeSong(60);
+    setBlocks(0, 60, {{385.0, 103}, {400.0, 185}}, 100);
+    decide(0, 0, 60);
+    double merged = std::exp((103 * std::log(385.0) + 185 * std::log(400.0)) / 288.0);
+    EXPECT_NEAR(blockPitch(30), merged, 1e-2) << "both bins, weighted: 16 cents below the partial";
+    EXPECT_LT(std::fabs(cents(blockPitch(30), 400.0)), 25.0);
+}
+
 TEST_F(PitchDecision, AnEntryOutsideTheBandAddsToTheAmplitudeButNotToThePitch) {
     makeSong(60);
     setBlocks(0, 60, {{260.0, 100}, {300.0, 90}}, 0);
