@@ -326,6 +326,15 @@ void sharpenTransitions(uint32_t from, uint32_t end) {
                 break;
             }
         }
+        // B began where its partial appeared and kept sounding up to the boundary, while A's was
+        // already fading (or no more than TRANSITION_RISE_SHARE times B's): the old note's
+        // release outweighs a slow attack for a while.
+        for (uint32_t k = boundary; k > lo;) {
+            int pa = partialAmplitude(k - 1, fa, nullptr), pb = partialAmplitude(k - 1, fb, nullptr);
+            bool fading = k - 1 > lo && pa < partialAmplitude(k - 2, fa, nullptr);
+            if (pb <= 0 || (!fading && TRANSITION_RISE_SHARE * pb < pa)) break;
+            boundary = --k;
+        }
         for (uint32_t k = lo; k < hi; k++) {
             bool isA = k <= a, isB = k >= t;
             if (k < boundary && !isA && partialAmplitude(k, fa, nullptr) > 0) takePartial(k, fa);

@@ -48,6 +48,9 @@ void fitPhrasesToSemitones(uint32_t from, uint32_t end);
 // Notes a semitone apart or less, or whose pitches could be harmonics of each other, keep
 // their boundary.
 constexpr double TRANSITION_REACH_SECONDS = 0.06;
+// ... moved back over the blocks before it where B's partial already sounds while A's fades,
+// or sounds at least 1/TRANSITION_RISE_SHARE of A's.
+constexpr int TRANSITION_RISE_SHARE = 2;
 void sharpenTransitions(uint32_t from, uint32_t end);
 // A dropout of at most DROPOUT_FILL_SECONDS between two pitches within a semitone of each other,
 // with no syllable starting in it or right after it, is filled with the pitch gliding between
