@@ -298,6 +298,15 @@ static void takePartial(uint32_t b, double frequency) {
     setPitch(b, like, where > 0.0 ? where : frequency, kept ? kept : uint8_t(std::max(1, std::min(255, amplitude))));
 }
 
+// The largest amplitude of the partial at frequency over the TRANSITION_PEAK_SECONDS before
+// block b, reading no block before lowest.
+static int recentPeak(uint32_t b, double frequency, uint32_t lowest) {
+    uint32_t span = uint32_t(std::max(1, blocksForSeconds(TRANSITION_PEAK_SECONDS)));
+    int peak = 0;
+    for (uint32_t k = b; k > lowest && b - k < span;) peak = std::max(peak, partialAmplitude(--k, frequency, nullptr));
+    return peak;
+}
+
 void sharpenTransitions(uint32_t from, uint32_t end) {
     uint32_t reach = uint32_t(std::max(1, blocksForSeconds(TRANSITION_REACH_SECONDS)));
     uint32_t gapLimit = uint32_t(std::max(1, blocksForSeconds(DROPOUT_FILL_SECONDS)));
@@ -329,13 +338,18 @@ void sharpenTransitions(uint32_t from, uint32_t end) {
         // B began where its partial appeared and kept sounding up to the boundary, while A's was
         // already fading (or no more than TRANSITION_RISE_SHARE times B's): the old note's
         // release outweighs a slow attack for a while.
-        for (uint32_t k = boundary; k > lo;) {
+        uint32_t riseReach = uint32_t(std::max(1, blocksForSeconds(TRANSITION_RISE_SECONDS)));
+        uint32_t riseLo = std::min(boundary, lo);
+        while (riseLo > from && a - (riseLo - 1) < riseReach && blockPitch(riseLo - 1) > 0.0 &&
+               nearFrequency(blockPitch(riseLo - 1), fa, SEMITONE_TOLERANCE))
+            riseLo--;
+        for (uint32_t k = boundary; k > riseLo;) {
             int pa = partialAmplitude(k - 1, fa, nullptr), pb = partialAmplitude(k - 1, fb, nullptr);
-            bool fading = k - 1 > lo && pa < partialAmplitude(k - 2, fa, nullptr);
+            bool fading = FADE_SHARE * recentPeak(k - 1, fa, riseLo) > 4.0 * pa;
             if (pb <= 0 || (!fading && TRANSITION_RISE_SHARE * pb < pa)) break;
             boundary = --k;
         }
-        for (uint32_t k = lo; k < hi; k++) {
+        for (uint32_t k = std::min(lo, boundary); k < hi; k++) {
             bool isA = k <= a, isB = k >= t;
             if (k < boundary && !isA && partialAmplitude(k, fa, nullptr) > 0) takePartial(k, fa);
             else if (k >= boundary && !isB && partialAmplitude(k, fb, nullptr) > 0) takePartial(k, fb);

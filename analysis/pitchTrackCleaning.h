@@ -48,9 +48,13 @@ void fitPhrasesToSemitones(uint32_t from, uint32_t end);
 // Notes a semitone apart or less, or whose pitches could be harmonics of each other, keep
 // their boundary.
 constexpr double TRANSITION_REACH_SECONDS = 0.06;
-// ... moved back over the blocks before it where B's partial already sounds while A's fades,
-// or sounds at least 1/TRANSITION_RISE_SHARE of A's.
+// ... moved back, over at most TRANSITION_RISE_SECONDS of A's end, across the blocks where B's
+// partial already sounds while A's fades (lies below FADE_SHARE quarters of its peak over the
+// TRANSITION_PEAK_SECONDS before), or sounds at least 1/TRANSITION_RISE_SHARE of A's.
 constexpr int TRANSITION_RISE_SHARE = 2;
+constexpr double TRANSITION_RISE_SECONDS = 0.1;
+constexpr double TRANSITION_PEAK_SECONDS = 0.06;
+constexpr double FADE_SHARE = 3.0;
 void sharpenTransitions(uint32_t from, uint32_t end);
 // A dropout of at most DROPOUT_FILL_SECONDS between two pitches within a semitone of each other,
 // with no syllable starting in it or right after it, is filled with the pitch gliding between

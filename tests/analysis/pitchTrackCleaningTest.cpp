@@ -165,6 +165,20 @@ TEST_F(RecognitionCleaning, AtATransitionTheNextNoteStartsWhereItRoseUnderTheFad
     EXPECT_NEAR(cents(blockPitch(42), 220.0), 0.0, 5.0) << "the decision alone keeps the fading note";
 }
 
+TEST_F(RecognitionCleaning, AnUnevenReleaseStillGivesTheBlocksToTheNoteRisingUnderIt) {
+    // A choir lets go of the lower note unevenly (it swells once more at block 45) while the
+    // upper note's slow attack is faintly there from block 41 on.
+    makeSong(80);
+    setBlocks(0, 41, {{220.0, 200}}, 150);
+    const int lower[] = {100, 70, 40, 45, 60, 20};
+    const int upper[] = {2, 3, 5, 8, 10, 30};
+    for (uint32_t b = 41; b < 47; b++) setBlock(b, {{220.0, lower[b - 41]}, {330.0, upper[b - 41]}}, 150);
+    setBlocks(47, 80, {{330.0, 200}}, 150);
+    recognisePitchTrack(0, 0);
+    EXPECT_NEAR(cents(blockPitch(40), 220.0), 0.0, 5.0);
+    for (uint32_t b = 41; b < 47; b++) EXPECT_NEAR(cents(blockPitch(b), 330.0), 0.0, 5.0) << "block " << b;
+}
+
 TEST_F(RecognitionCleaning, ANoteThatHoldsOnKeepsItsBlocksFromAFaintNextOne) {
     makeSong(80);
     setBlocks(0, 40, {{220.0, 200}}, 150);
