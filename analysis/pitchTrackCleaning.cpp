@@ -40,15 +40,39 @@ void spectrogramRowsOfBlocks(uint32_t from, uint32_t end, int* rows) {
     }
 }
 
-int isSibilantRow(const uint32_t* magnitudes, uint32_t count, double binWidth) {
-    uint64_t low = 0, high = 0;
+// The low and high sibilant bands of a row.
+static void sibilantBands(const uint32_t* magnitudes, uint32_t count, double binWidth, uint64_t* low, uint64_t* high) {
+    *low = *high = 0;
     for (uint32_t i = 3; i < count; i++) {
         double f = (i + 1) * binWidth;
-        if (f <= SIBILANT_SPLIT_HZ) low += magnitudes[i];
-        else if (f < SIBILANT_HIGH_LIMIT_HZ) high += magnitudes[i];
+        if (f <= SIBILANT_SPLIT_HZ) *low += magnitudes[i];
+        else if (f < SIBILANT_HIGH_LIMIT_HZ) *high += magnitudes[i];
         else break;
     }
+}
+
+int isSibilantRow(const uint32_t* magnitudes, uint32_t count, double binWidth) {
+    uint64_t low, high;
+    sibilantBands(magnitudes, count, binWidth, &low, &high);
     return high >= SIBILANT_MIN_HIGH_BAND && high > low;
+}
+
+// The high band of the background: the SIBILANT_FLOOR_PERCENT-th percentile of the rows' high
+// bands. Hiss or noise under the whole recording passes the sibilant test everywhere it is
+// louder than the voice; a sibilant stands out of it.
+static uint64_t sibilantFloor(const std::vector<int>& rows) {
+    const MagnitudeSpectrogram& s = magnitudeSpectrogram;
+    std::vector<uint64_t> highs;
+    for (int r : rows) {
+        if (r < 0) continue;
+        uint64_t low, high;
+        sibilantBands(spectrogramRow(uint32_t(r)), s.binsPerRow, s.binWidth, &low, &high);
+        highs.push_back(high);
+    }
+    if (highs.empty()) return 0;
+    size_t k = highs.size() * SIBILANT_FLOOR_PERCENT / 100;
+    std::nth_element(highs.begin(), highs.begin() + long(k), highs.end());
+    return highs[k];
 }
 
 // The blocks [from, to) all hold a pitch within two semitones of pitch.
@@ -71,9 +95,14 @@ void appendSibilants(uint32_t from, uint32_t end) {
     std::vector<int> rows(end - from);
     spectrogramRowsOfBlocks(from, end, rows.data());
     std::vector<uint8_t> sibilant(end - from, 0);
+    uint64_t floor = sibilantFloor(rows);
     for (uint32_t b = from; b < end; b++) {
         int r = rows[b - from];
-        sibilant[b - from] = r >= 0 && blockPitch(b) <= 0.0 && isSibilantRow(spectrogramRow(uint32_t(r)), s.binsPerRow, s.binWidth);
+        if (r < 0 || blockPitch(b) > 0.0) continue;
+        const uint32_t* row = spectrogramRow(uint32_t(r));
+        uint64_t low, high;
+        sibilantBands(row, s.binsPerRow, s.binWidth, &low, &high);
+        sibilant[b - from] = isSibilantRow(row, s.binsPerRow, s.binWidth) && high >= SIBILANT_FLOOR_FACTOR * floor;
     }
     uint32_t windowFirst = ftBlockWindow.firstBlock;
     for (uint32_t b = from; b < end;) {

@@ -5,6 +5,7 @@
 // semitone grid, short dropouts bridged. The recognition pass calls them in that order over the
 // blocks it decides; each changes only the blocks [from, end) it is given.
 
+#include <cstddef>
 #include <cstdint>
 
 // Sibilant rows: the magnitudes above this split and below twice it, against those below it.
@@ -15,6 +16,10 @@ constexpr uint32_t SIBILANT_MIN_HIGH_BAND = 1024;
 // and greater than its low band. magnitudes holds count values, magnitude i at (i + 1) x
 // binWidth Hz; the first three are left out of both bands.
 int isSibilantRow(const uint32_t* magnitudes, uint32_t count, double binWidth);
+// Only rows whose high band is at least SIBILANT_FLOOR_FACTOR times the background's (the
+// SIBILANT_FLOOR_PERCENT-th percentile of the pass's rows) count: steady hiss is no consonant.
+constexpr uint64_t SIBILANT_FLOOR_FACTOR = 4;
+constexpr size_t SIBILANT_FLOOR_PERCENT = 10;
 // Runs of unpitched sibilant blocks right after a note take its pitch when as many blocks
 // before the run hold that pitch within two semitones; failing that, runs right before a note
 // take the pitch of the note after them on the same condition.

@@ -106,6 +106,20 @@ TEST_F(RecognitionSibilants, AnSBeforeANoteTakesThePitchOfTheNoteAfterIt) {
     EXPECT_EQ(blockPitch(9), 0.0);
 }
 
+TEST_F(RecognitionSibilants, HissUnderTheWholeRecordingIsNoSibilant) {
+    // Hiss (high band 1500, above the 1024 rule and the low band) everywhere: the ten blocks
+    // after the note are no louder than the rest, so they are no "S".
+    makeSong(60);
+    setPitches(0, 50, 220.0);
+    makeRows(120, [&](uint32_t, uint32_t* row) { sibilantRow(row, 500, 1500u); });
+    appendSibilants(0, 60);
+    EXPECT_EQ(blockPitch(50), 0.0);
+    // An "S" standing four times above the hiss is one.
+    makeRows(120, [&](uint32_t r, uint32_t* row) { sibilantRow(row, 500, r >= 100 ? 6000u : 1500u); });
+    appendSibilants(0, 60);
+    for (uint32_t b = 50; b < 60; b++) EXPECT_NEAR(blockPitch(b), 220.0, 1e-3) << "block " << b;
+}
+
 class RecognitionCleaning : public RecognitionTest {};
 
 TEST_F(RecognitionCleaning, ARunBelowHalfTheCutOffLevelLosesItsEntries) {
