@@ -49,8 +49,10 @@ constexpr int VOWEL_BANDS = 15;
 constexpr double VOWEL_SIDE_SECONDS = 0.05;
 constexpr double VOWEL_CHANGE_DB = 5.0;
 constexpr double VOWEL_DIP_DB = 1.0;
-// Two syllable starts are at least this far apart; the earlier one stands.
-constexpr double SYLLABLE_MIN_SPACING_SECONDS = 0.1;
+// Two syllable starts are at least this far apart; the earlier one stands. A syllable opening
+// on a voiced consonant changes colour twice, into the consonant and out of it into the vowel
+// some 0.1 s later; only the first is the syllable's start.
+constexpr double SYLLABLE_MIN_SPACING_SECONDS = 0.15;
 
 struct Syllables {
     std::vector<uint32_t> startBlocks;   // blocks where the last pass found a syllable start, ascending

@@ -32,6 +32,19 @@ TEST_F(SyllableStarts, ADeepLoudnessDipBetweenTwoLoudStretchesStartsASyllable) {
     EXPECT_EQ(marked, 1);
 }
 
+TEST_F(SyllableStarts, TwoStartsLessThanFifteenHundredthsApartKeepTheEarlier) {
+    // Dips at rows 200, 220 (0.116 s later: a consonant and the vowel it opens) and 260.
+    auto quiet = [](uint32_t r) { return (r >= 200 && r < 206) || (r >= 220 && r < 226) || (r >= 260 && r < 266); };
+    makeSong(BLOCKS);
+    setPitches(0, BLOCKS, 200.0);
+    makeRows(2 * BLOCKS, [&](uint32_t r, uint32_t* row) { voicedRow(row, quiet(r) ? 20000u : 100000u, 1000); });
+    findSyllables(0, BLOCKS);
+    ASSERT_EQ(syllables.startBlocks.size(), 2u);
+    EXPECT_LE(syllables.startBlocks[0], 100u);
+    EXPECT_GE(syllables.startBlocks[1], 129u);
+    EXPECT_LE(syllables.startBlocks[1], 130u);
+}
+
 TEST_F(SyllableStarts, AShallowDipIsNoSyllable) {
     makeSong(BLOCKS);
     setPitches(0, BLOCKS, 200.0);
