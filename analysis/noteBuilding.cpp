@@ -249,8 +249,19 @@ static bool nearerTo(uint32_t b, int from, int to) {
 static void splitGlides(uint32_t first, uint32_t end, int* semitones, int voice) {
     std::vector<SemitoneRun> runs = semitoneRuns(first, end, semitones);
     uint32_t gapLimit = uint32_t(std::max(1, blocksForSeconds(GLIDE_GAP_SECONDS)));
+    // A run is a note when it lasts the voice's shortest note, unless it is short and its pitch
+    // wanders over most of a semitone (a slow glide dwelling on a semitone on its way).
     auto isNote = [voice](const SemitoneRun& r) {
-        return r.semitone >= 0 && songTimeOfBlock(r.to, r.from) >= shortestNoteSeconds(voice, r.semitone);
+        if (r.semitone < 0) return false;
+        double duration = songTimeOfBlock(r.to, r.from);
+        if (duration < shortestNoteSeconds(voice, r.semitone)) return false;
+        if (duration >= GLIDE_RUN_SECONDS) return true;
+        double low = 1e9, high = -1e9;
+        for (uint32_t b = r.from; b < r.to; b++) {
+            double p = frequencyToPitch(blockPitch(b));
+            low = std::min(low, p), high = std::max(high, p);
+        }
+        return high - low < GLIDE_RUN_DRIFT;
     };
     for (size_t i = 0; i < runs.size(); i++) {
         if (!isNote(runs[i])) continue;

@@ -18,6 +18,10 @@ constexpr double SEMITONE_HYSTERESIS = 0.3;
 // that already leans towards the new one, seconds.
 constexpr double GLIDE_GAP_SECONDS = 0.06;
 constexpr double GLIDE_REACH_SECONDS = 0.06;
+// A run shorter than GLIDE_RUN_SECONDS whose pitches spread over GLIDE_RUN_DRIFT semitones or
+// more is part of a glide, not a note.
+constexpr double GLIDE_RUN_SECONDS = 0.15;
+constexpr double GLIDE_RUN_DRIFT = 0.75;
 // Note building decides the semitones from this long before its first block, seconds.
 constexpr double GLIDE_CONTEXT_SECONDS = 0.3;
 // A boundary between two notes moves forward to a syllable start at most this far after it,

@@ -105,6 +105,24 @@ TEST_F(NoteBuilding, AGlideBetweenTwoNotesIsSplitWhereItPassesTheMiddle) {
     EXPECT_EQ(noteList.notes[1].midiNote, 64);
 }
 
+TEST_F(NoteBuilding, ASlowGlideDwellingOnASemitoneIsNoNoteButAShortSteadyNoteIs) {
+    makeSong(90);
+    setPitches(10, 40, pitchToFrequency(57));
+    // 0.093 s around 60, wandering from 59.6 up to 60.4 on the way to 64.
+    for (uint32_t b = 40; b < 48; b++) setPitch(b, pitchToFrequency(59.6 + 0.8 * double(b - 40) / 7.0));
+    setPitches(48, 80, pitchToFrequency(64));
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 2);
+    EXPECT_NEAR(noteList.notes[0].waveEnd, blockTime(48), 1e-6) << "every block of the way lies nearer 57";
+    EXPECT_NEAR(noteList.notes[1].waveStart, blockTime(48), 1e-6);
+
+    resetNoteList();
+    setPitches(40, 48, pitchToFrequency(60));
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 3);
+    EXPECT_EQ(noteList.notes[1].midiNote, 60);
+}
+
 TEST_F(NoteBuilding, AShortSilenceAfterAGlideBelongsToTheNoteTheGlideReached) {
     makeSong(90);
     setPitches(10, 40, pitchToFrequency(57));
