@@ -205,7 +205,12 @@ static int chooseFundamental(uint32_t block, uint32_t endBlock, bool useRange, i
         if (last >= 0) {
             double semitones = 12.0 * std::log2(k.frequency / candidates[last].frequency);
             double lowest = previousFrequency < recognitionOptions.lowPitchLimit ? 5.0 : 10.0;
-            if (semitones >= lowest && semitones <= 14.0) {
+            // Its octave, or its twelfth (the third harmonic, which a bright voice sounds
+            // louder than both the fundamental and the octave), counts for it.
+            // A faint entry does not take over a loud partial as its harmonic.
+            bool twelfth = semitones >= TWELFTH_LOW_SEMITONES && semitones <= TWELFTH_HIGH_SEMITONES &&
+                           TWELFTH_SHARE * data.entries[candidates[last].entry].amplitude >= data.entries[k.entry].amplitude;
+            if ((semitones >= lowest && semitones <= 14.0) || twelfth) {
                 candidates[last].support += k.weight;
                 previousFrequency = k.frequency;
                 continue;

@@ -34,6 +34,12 @@ constexpr double REFERENCE_SECONDS = 5.0;
 constexpr double REFERENCE_MIN_SECONDS = 0.25;
 constexpr double OCTAVE_CHECK_SEMITONES = 12.0;
 
+// A candidate within half a semitone of the last strong one's third harmonic (19.02 semitones
+// above) counts for it, like one 10 to 14 semitones above (its octave), when the strong one
+// is at least 1/TWELFTH_SHARE as loud.
+constexpr double TWELFTH_LOW_SEMITONES = 18.5;
+constexpr double TWELFTH_HIGH_SEMITONES = 19.5;
+constexpr int TWELFTH_SHARE = 32;
 // A step by a factor between r and 2.2 (or the inverse) is an octave slip, r being
 // OCTAVE_STEP_RATIO, or LOW_OCTAVE_STEP_RATIO when a frequency is below the low-pitch limit.
 constexpr double OCTAVE_STEP_RATIO = 1.8;

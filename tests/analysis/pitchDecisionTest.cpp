@@ -59,6 +59,16 @@ TEST_F(PitchDecision, TheFundamentalOfALowVoiceWinsOverItsStrongerSecondHarmonic
     EXPECT_NEAR(cents(blockPitch(30), 103.8), 0.0, 50.0);
 }
 
+TEST_F(PitchDecision, ABrightVoicesLoudThirdHarmonicCountsForItsFundamental) {
+    // A rumble at 100 Hz keeps the fundamental from dominating what lies below it, and the
+    // third harmonic dominates the octave below it: only counting it for the fundamental
+    // keeps the note.
+    makeSong(60);
+    setBlocks(0, 60, {{100.0, 20}, {138.6, 17}, {277.2, 28}, {415.8, 69}}, 150);
+    decide(0, 0, 60);
+    EXPECT_NEAR(cents(blockPitch(30), 138.6), 0.0, 50.0);
+}
+
 TEST_F(PitchDecision, AWeakFundamentalThatHoldsOnUnderAStrongOctaveIsTheNote) {
     makeSong(60);
     setBlocks(0, 60, {{230.0, 4}, {460.0, 200}}, 150);
