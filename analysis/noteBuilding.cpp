@@ -427,11 +427,17 @@ static void snapToSyllables(std::vector<NoteCandidate>& candidates) {
 // blocks on its pitch: breath, the hum of a nasal before the vowel, noise the analysis found
 // the pitch in. Its start is where the track's amplitude first reaches 1/FAINT_START_RATIO of
 // its largest over the note's first FAINT_START_SECONDS.
-static void trimFaintStart(NoteCandidate& c, uint32_t windowFirst) {
-    // Only after silence: a note that follows another, even across a short dropout, keeps its start.
+// Whether no block holds a pitch for SNAP_KEEP_SECONDS before the candidate: it starts out of
+// silence, not after another note (even across a short dropout).
+static bool followsSilence(const NoteCandidate& c, uint32_t windowFirst) {
     uint32_t silence = uint32_t(std::max(1, blocksForSeconds(SNAP_KEEP_SECONDS)));
     for (uint32_t b = c.first; b > windowFirst && c.first - b < silence; b--)
-        if (blockPitch(b - 1) > 0.0) return;
+        if (blockPitch(b - 1) > 0.0) return false;
+    return true;
+}
+
+static void trimFaintStart(NoteCandidate& c, uint32_t windowFirst) {
+    if (!followsSilence(c, windowFirst)) return;
     auto amplitude = [](uint32_t b) { return blockData(b).nEntries ? int(blockData(b).entries[0].amplitude) : 0; };
     uint32_t span = uint32_t(std::max(1, blocksForSeconds(FAINT_START_SECONDS)));
     uint32_t spanEnd = std::min(c.end, c.first + span);
@@ -439,6 +445,28 @@ static void trimFaintStart(NoteCandidate& c, uint32_t windowFirst) {
     for (uint32_t b = c.first; b < spanEnd; b++) largest = std::max(largest, amplitude(b));
     uint32_t keep = uint32_t(std::max(1, blocksForSeconds(SNAP_KEEP_SECONDS)));
     while (c.first + keep < c.end && amplitude(c.first) * FAINT_START_RATIO < largest) c.first++;
+}
+
+// A note out of silence whose tone needs a while to settle (a choir's slow "aah") is heard
+// before the track finds its pitch. When the loudness leapt out of silence (at most
+// 1/LOUDNESS_SILENCE_RATIO of the note's loudest over its first FAINT_START_SECONDS) at most
+// LOUDNESS_RISE_SECONDS before the note and stayed above 1/LOUDNESS_RISE_RATIO of it since,
+// the note starts at that leap.
+static void startAtLoudnessLeap(NoteCandidate& c, uint32_t limit, uint32_t windowFirst) {
+    if (!followsSilence(c, windowFirst)) return;
+    uint32_t span = uint32_t(std::max(1, blocksForSeconds(FAINT_START_SECONDS)));
+    int loudest = 0;
+    for (uint32_t b = c.first; b < std::min(c.end, c.first + span); b++) loudest = std::max<int>(loudest, blockData(b).blockLoudness);
+    uint32_t reach = uint32_t(std::max(1, blocksForSeconds(LOUDNESS_RISE_SECONDS)));
+    uint32_t lowest = std::max(limit, c.first > reach ? c.first - reach : 0);
+    for (uint32_t b = c.first; b > lowest; b--) {
+        int before = blockData(b - 1).blockLoudness;
+        if (before * LOUDNESS_SILENCE_RATIO <= loudest) {
+            c.first = b;
+            return;
+        }
+        if (before * LOUDNESS_RISE_RATIO < loudest) return;
+    }
 }
 
 static void measureCandidate(NoteCandidate& c) {
@@ -509,6 +537,8 @@ uint32_t buildNotes(uint32_t fromSample, int notesToDrop) {
     for (NoteCandidate& c : candidates) trimFaintStart(c, w.firstBlock);
     for (size_t i = 0; i < candidates.size(); i++)
         advanceOnset(candidates[i], i > 0 ? &candidates[i - 1] : nullptr, first);
+    for (size_t i = 0; i < candidates.size(); i++)
+        startAtLoudnessLeap(candidates[i], i > 0 ? std::max(first, candidates[i - 1].end) : first, w.firstBlock);
     if (recognitionOptions.monophonicRecognition && recognitionOptions.findSyllables) snapToSyllables(candidates);
     for (NoteCandidate& c : candidates) measureCandidate(c);
 

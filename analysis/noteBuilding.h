@@ -32,6 +32,12 @@ constexpr double SNAP_KEEP_SECONDS = 0.05;
 // of its largest over the note's first FAINT_START_SECONDS.
 constexpr double FAINT_START_SECONDS = 0.1;
 constexpr int FAINT_START_RATIO = 8;
+// A note out of silence starts where the loudness leapt out of silence (from at most
+// 1/LOUDNESS_SILENCE_RATIO of its loudest over its first FAINT_START_SECONDS), at most
+// LOUDNESS_RISE_SECONDS earlier, when it stayed above 1/LOUDNESS_RISE_RATIO of it since.
+constexpr double LOUDNESS_RISE_SECONDS = 0.1;
+constexpr int LOUDNESS_RISE_RATIO = 4;
+constexpr int LOUDNESS_SILENCE_RATIO = 16;
 // A note starts where its partial began to rise, at most this much before the pitch track
 // takes it, seconds.
 constexpr double ONSET_ADVANCE_SECONDS = 0.08;

@@ -203,6 +203,23 @@ TEST_F(NoteBuilding, AFaintStartOutOfSilenceIsLeftOut) {
     EXPECT_NEAR(noteList.notes[1].waveStart, blockTime(20), 1e-6);
 }
 
+TEST_F(NoteBuilding, ANoteOutOfSilenceStartsWhereTheLoudnessLeaptUp) {
+    auto onsetAfter = [&](int silence, int attack) {
+        resetNoteList();
+        for (uint32_t b = 0; b < 20; b++) blockData(b).blockLoudness = uint8_t(silence);
+        for (uint32_t b = 20; b < 23; b++) blockData(b).blockLoudness = uint8_t(attack);   // no pitch yet
+        setPitches(23, 60, 220.0);
+        for (uint32_t b = 23; b < 60; b++) blockData(b).blockLoudness = 240;
+        buildNotes(0, 0);
+        EXPECT_EQ(noteList.count, 1);
+        return noteList.count ? noteList.notes[0].waveStart : -1.0f;
+    };
+    makeSong(80);
+    EXPECT_NEAR(onsetAfter(0, 80), blockTime(20), 1e-6) << "a slow attack out of silence";
+    EXPECT_NEAR(onsetAfter(0, 40), blockTime(23), 1e-6) << "too faint to be the note yet";
+    EXPECT_NEAR(onsetAfter(50, 80), blockTime(23), 1e-6) << "out of noise, not silence";
+}
+
 TEST_F(NoteBuilding, ANoteSplitsAtASyllableStartWellInsideIt) {
     makeSong(120);
     setPitches(0, 100, 220.0, 100);
