@@ -312,6 +312,49 @@ static void splitGlides(uint32_t first, uint32_t end, int* semitones, int voice)
     }
 }
 
+// A short run an octave away from the note right after it (or, failing that, right before it)
+// is that note's octave slip: at a consonant or a soft attack the track may hold the second
+// harmonic for a few blocks, too long for the octave-jump pass to fold when a glide lies on
+// its other side. It joins that note, with the silence of at most GLIDE_GAP_SECONDS between,
+// when the note's own partial is there under it.
+static void foldOctaveSlips(uint32_t first, uint32_t end, int* semitones) {
+    std::vector<SemitoneRun> runs = semitoneRuns(first, end, semitones);
+    uint32_t gapLimit = uint32_t(std::max(1, blocksForSeconds(GLIDE_GAP_SECONDS)));
+    auto octaveApart = [](int a, int b) { return std::abs(std::abs(a - b) - 12) <= 1; };
+    auto neighbour = [&](size_t i, int step) -> const SemitoneRun* {
+        size_t j = i;
+        while (true) {
+            if ((step < 0 && j == 0) || (step > 0 && j + 1 >= runs.size())) return nullptr;
+            j = step < 0 ? j - 1 : j + 1;
+            if (runs[j].semitone >= 0) return &runs[j];
+            if (runs[j].to - runs[j].from > gapLimit) return nullptr;
+        }
+    };
+    for (size_t i = 0; i < runs.size(); i++) {
+        SemitoneRun& r = runs[i];
+        if (r.semitone < 0 || songTimeOfBlock(r.to, r.from) >= OCTAVE_SLIP_SECONDS) continue;
+        const SemitoneRun* into = nullptr;
+        const SemitoneRun* after = neighbour(i, 1);
+        const SemitoneRun* before = neighbour(i, -1);
+        if (after && songTimeOfBlock(after->to, after->from) >= OCTAVE_SLIP_SECONDS && octaveApart(r.semitone, after->semitone)) into = after;
+        else if (before && songTimeOfBlock(before->to, before->from) >= OCTAVE_SLIP_SECONDS && octaveApart(r.semitone, before->semitone)) into = before;
+        if (!into) continue;
+        // The note itself must sound under the slip, however faintly: a short note an octave
+        // from the next is a leap.
+        bool heard = false;
+        double target = pitchToFrequency(into->semitone);
+        for (uint32_t b = r.from; b < r.to && !heard; b++) {
+            const FTDataBuffer& data = blockOrigData(b);
+            for (uint32_t k = 0; k < data.nEntries && !heard; k++)
+                heard = data.entries[k].amplitude && nearFrequency(data.entries[k].frequency, target, HALF_SEMITONE_TOLERANCE);
+        }
+        if (!heard) continue;
+        uint32_t from = std::min(r.from, into->to), to = std::max(r.to, into->from);
+        for (uint32_t b = from; b < to; b++) semitones[b - first] = into->semitone;
+        r.semitone = into->semitone;
+    }
+}
+
 // Runs of one semitone shorter than the voice's shortest note are slivers of a transition or
 // a wobble: one between two runs of the same semitone joins them, else one right before a
 // run within two semitones becomes that note's start (a scoop or the attack of the next
@@ -512,6 +555,7 @@ uint32_t buildNotes(uint32_t fromSample, int notesToDrop) {
     std::vector<int> contextSemitones(end - context);
     int voice = voiceOf(songDefinition(songInstruments.settledVoice));
     heldSemitones(context, end, contextSemitones.data());
+    foldOctaveSlips(context, end, contextSemitones.data());
     splitGlides(context, end, contextSemitones.data(), voice);
     absorbSlivers(context, end, contextSemitones.data(), voice);
     const int* semitones = contextSemitones.data() + (first - context);

@@ -22,6 +22,9 @@ constexpr double GLIDE_REACH_SECONDS = 0.06;
 // more is part of a glide, not a note.
 constexpr double GLIDE_RUN_SECONDS = 0.15;
 constexpr double GLIDE_RUN_DRIFT = 0.75;
+// A run shorter than this an octave (12 +- 1 semitones) away from a longer note right after or
+// before it is that note's octave slip, seconds.
+constexpr double OCTAVE_SLIP_SECONDS = 0.15;
 // Note building decides the semitones from this long before its first block, seconds.
 constexpr double GLIDE_CONTEXT_SECONDS = 0.3;
 // A boundary between two notes moves forward to a syllable start at most this far after it,

@@ -220,6 +220,29 @@ TEST_F(NoteBuilding, ANoteOutOfSilenceStartsWhereTheLoudnessLeaptUp) {
     EXPECT_NEAR(onsetAfter(50, 80), blockTime(23), 1e-6) << "out of noise, not silence";
 }
 
+TEST_F(NoteBuilding, AnOctaveSlipAtANotesStartJoinsItButAShortLeapStays) {
+    // 0.093 s on 56 (the second harmonic of 44, its fundamental faintly there), then 44.
+    auto build = [&](bool fundamentalHeard) {
+        resetNoteList();
+        for (uint32_t b = 30; b < 38; b++)
+            setBlock(b, fundamentalHeard ? std::vector<TestEntry>{{pitchToFrequency(44), 2}, {pitchToFrequency(56), 60}}
+                                         : std::vector<TestEntry>{{pitchToFrequency(56), 60}}, 150);
+        setBlocks(38, 80, {{pitchToFrequency(44), 200}}, 150);
+        setPitches(30, 38, pitchToFrequency(56));
+        setPitches(38, 80, pitchToFrequency(44));
+        buildNotes(0, 0);
+    };
+    makeSong(90);
+    build(true);
+    ASSERT_EQ(noteList.count, 1);
+    EXPECT_EQ(noteList.notes[0].midiNote, 44);
+    EXPECT_NEAR(noteList.notes[0].waveStart, blockTime(30), 1e-6);
+
+    build(false);
+    ASSERT_EQ(noteList.count, 2) << "a short note an octave above the next is a leap";
+    EXPECT_EQ(noteList.notes[0].midiNote, 56);
+}
+
 TEST_F(NoteBuilding, ANoteSplitsAtASyllableStartWellInsideIt) {
     makeSong(120);
     setPitches(0, 100, 220.0, 100);
