@@ -172,11 +172,13 @@ static void consonantStarts(const SyllableCues& c, std::vector<size_t>& starts) 
     size_t around = std::max<size_t>(1, size_t(CONSONANT_LOUDNESS_SECONDS / rowSeconds + 0.5));
     for (size_t r = 1; r + 1 < n; r++) {
         if (ratio[r] < CONSONANT_MIN_RATIO || ratio[r] < ratio[r - 1] || ratio[r] <= ratio[r + 1]) continue;
-        // A consonant interrupts the voice: it is quieter than the vowels around it. A vowel
-        // changing colour brightens without losing loudness.
-        double loudest = 0.0;
-        for (size_t k = r > around ? r - around : 0; k < n && k <= r + around; k++) loudest = std::max(loudest, c.totals[k]);
-        if (c.totals[r] > CONSONANT_QUIETER * loudest) continue;
+        // A consonant interrupts the voice: it is quieter than the vowels on both sides of it. A
+        // vowel changing colour brightens without losing loudness, and the bright attack of an
+        // instrument's note fades into a quieter but still sounding note.
+        double loudBefore = 0.0, loudAfter = 0.0;
+        for (size_t k = r > around ? r - around : 0; k < r; k++) loudBefore = std::max(loudBefore, c.totals[k]);
+        for (size_t k = r + 1; k < n && k <= r + around; k++) loudAfter = std::max(loudAfter, c.totals[k]);
+        if (c.totals[r] > CONSONANT_QUIETER * std::min(loudBefore, loudAfter)) continue;
         if (fallRow(ratio, r, -1, reach, flat) == n) continue;
         size_t after = fallRow(ratio, r, 1, reach, flat);
         if (after == n) continue;

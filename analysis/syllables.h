@@ -33,7 +33,7 @@ constexpr double CONSONANT_FLAT_CHANGE = 0.01;
 constexpr double CONSONANT_FLAT_SECONDS = 0.03;
 constexpr double CONSONANT_REACH_SECONDS = 0.2;
 // ... and whose row is at most CONSONANT_QUIETER of the loudest row within
-// CONSONANT_LOUDNESS_SECONDS of it.
+// CONSONANT_LOUDNESS_SECONDS before it and of the loudest within as long after it.
 constexpr double CONSONANT_QUIETER = 0.5;
 constexpr double CONSONANT_LOUDNESS_SECONDS = 0.1;
 // Vowel changes ("CS Detect syllables"): a voiced consonant (l, m, n) between two vowels barely

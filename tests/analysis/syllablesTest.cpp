@@ -121,6 +121,22 @@ TEST_F(SyllableStarts, ARowsColourIsItsThirdOctaveLevelsAboutTheirMean) {
     EXPECT_NEAR(loudness, 10.0 * std::log10(1000.0 * 1000.0 + 10000.0 * 10000.0 + 13.0), 1e-9);
 }
 
+TEST_F(SyllableStarts, ABrightFadeIntoAQuieterSoundIsNoConsonant) {
+    // The rows 198 .. 203 brighten as in a consonant, but what follows stays no louder than
+    // they are: the voice was not interrupted, a bright attack faded.
+    auto fade = [&](uint32_t r, uint32_t* row) {
+        if (r < 198) voicedRow(row, 100000u, 1000u);
+        else if (r < 204) voicedRow(row, 18000u, 27000u);
+        else voicedRow(row, 30000u, 300u);
+    };
+    makeSong(BLOCKS);
+    setPitches(0, BLOCKS, 200.0);
+    makeRows(2 * BLOCKS, fade);
+    generalSettings.detectSyllables = true;
+    findSyllables(0, BLOCKS);
+    for (uint32_t b : syllables.startBlocks) EXPECT_FALSE(b >= 98 && b <= 103) << "block " << b;
+}
+
 TEST_F(SyllableStarts, BlocksTheSpectrogramNoLongerCoversKeepTheirStarts) {
     makeSong(BLOCKS);
     setPitches(0, BLOCKS, 200.0);
