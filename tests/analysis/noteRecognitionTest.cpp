@@ -58,6 +58,28 @@ TEST_F(Recognition, ASungMelodyBecomesItsNotes) {
     EXPECT_EQ(blockPitch(blockAtTime(0.82)), 0.0);
 }
 
+TEST_F(Recognition, NotesBuiltChunkByChunkAreTheNotesOfOnePassOverTheWholeSong) {
+    setSongFormat(TEST_RATE, 16);
+    std::vector<uint8_t> bytes(size_t(2.45 * TEST_RATE) * 2);
+    MelodyGenerator generator;
+    generator.fill16(bytes.data(), uint32_t(bytes.size() / 2));
+    ASSERT_EQ(setupFrequencyAnalysis(), 1);
+    ByteSource source{&bytes, 0, 2};
+    ASSERT_EQ(analyseWithRecognition(readByteSource, &source), 1);
+    std::vector<Note> chunked(noteList.notes, noteList.notes + noteList.count);
+    ASSERT_EQ(chunked.size(), 6u);
+
+    // The same blocks, the notes built again in one call over all of them.
+    buildNotes(0, noteList.count);
+    ASSERT_EQ(size_t(noteList.count), chunked.size());
+    for (size_t k = 0; k < chunked.size(); k++) {
+        EXPECT_EQ(noteList.notes[k].midiNote, chunked[k].midiNote) << "note " << k;
+        EXPECT_FLOAT_EQ(noteList.notes[k].waveStart, chunked[k].waveStart) << "note " << k;
+        EXPECT_FLOAT_EQ(noteList.notes[k].waveEnd, chunked[k].waveEnd) << "note " << k;
+        EXPECT_FLOAT_EQ(noteList.notes[k].pitch, chunked[k].pitch) << "note " << k;
+    }
+}
+
 TEST_F(Recognition, WithoutAnalyseScoreTheTablesAreMadeButNoNotes) {
     setSongFormat(TEST_RATE, 16);
     recognitionOptions.analyseScore = false;
