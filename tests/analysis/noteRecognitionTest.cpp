@@ -29,19 +29,24 @@ protected:
     // The onset, seconds, of MelodyGenerator's note k: notes of 0.4 s, each after a 0.05 s gap.
     static double melodyOnset(int k) { return 0.4 * k + 0.05; }
     static int melodySemitone(int k) { return frequencyToSemitone(MelodyGenerator::noteFrequency(uint64_t(k))); }
+    // 2.45 s of MelodyGenerator's melody through the chunked analysis with recognition following it.
+    void analyseMelody() {
+        setSongFormat(TEST_RATE, 16);
+        melodyBytes.assign(size_t(2.45 * TEST_RATE) * 2, 0);
+        MelodyGenerator generator;
+        generator.fill16(melodyBytes.data(), uint32_t(melodyBytes.size() / 2));
+        ASSERT_EQ(setupFrequencyAnalysis(), 1);
+        ByteSource source{&melodyBytes, 0, 2};
+        ASSERT_EQ(analyseWithRecognition(readByteSource, &source), 1);
+    }
+    std::vector<uint8_t> melodyBytes;
 
     TempFolder folder;
     Paths savedPaths;
 };
 
 TEST_F(Recognition, ASungMelodyBecomesItsNotes) {
-    setSongFormat(TEST_RATE, 16);
-    std::vector<uint8_t> bytes(size_t(2.45 * TEST_RATE) * 2);
-    MelodyGenerator generator;
-    generator.fill16(bytes.data(), uint32_t(bytes.size() / 2));
-    ASSERT_EQ(setupFrequencyAnalysis(), 1);
-    ByteSource source{&bytes, 0, 2};
-    ASSERT_EQ(analyseWithRecognition(readByteSource, &source), 1);
+    analyseMelody();
     ASSERT_EQ(noteList.count, 6) << "six notes of 0.4 s";
     for (int k = 0; k < 6; k++) {
         const Note& n = noteList.notes[k];
@@ -59,13 +64,7 @@ TEST_F(Recognition, ASungMelodyBecomesItsNotes) {
 }
 
 TEST_F(Recognition, NotesBuiltChunkByChunkAreTheNotesOfOnePassOverTheWholeSong) {
-    setSongFormat(TEST_RATE, 16);
-    std::vector<uint8_t> bytes(size_t(2.45 * TEST_RATE) * 2);
-    MelodyGenerator generator;
-    generator.fill16(bytes.data(), uint32_t(bytes.size() / 2));
-    ASSERT_EQ(setupFrequencyAnalysis(), 1);
-    ByteSource source{&bytes, 0, 2};
-    ASSERT_EQ(analyseWithRecognition(readByteSource, &source), 1);
+    analyseMelody();
     std::vector<Note> chunked(noteList.notes, noteList.notes + noteList.count);
     ASSERT_EQ(chunked.size(), 6u);
 
