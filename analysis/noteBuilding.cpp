@@ -466,10 +466,6 @@ static void snapToSyllables(std::vector<NoteCandidate>& candidates) {
     }
 }
 
-// A note out of silence (no pitch for SNAP_KEEP_SECONDS before it) may begin with a few faint
-// blocks on its pitch: breath, the hum of a nasal before the vowel, noise the analysis found
-// the pitch in. Its start is where the track's amplitude first reaches 1/FAINT_START_RATIO of
-// its largest over the note's first FAINT_START_SECONDS.
 // Whether no block holds a pitch for SNAP_KEEP_SECONDS before the candidate: it starts out of
 // silence, not after another note (even across a short dropout).
 static bool followsSilence(const NoteCandidate& c, uint32_t windowFirst) {
@@ -479,6 +475,10 @@ static bool followsSilence(const NoteCandidate& c, uint32_t windowFirst) {
     return true;
 }
 
+// A note out of silence may begin with a few faint blocks on its pitch: breath, the hum of a
+// nasal before the vowel, noise the analysis found the pitch in. Its start is where the track's
+// amplitude first reaches 1/FAINT_START_RATIO of its largest over the note's first
+// FAINT_START_SECONDS.
 static void trimFaintStart(NoteCandidate& c, uint32_t windowFirst) {
     if (!followsSilence(c, windowFirst)) return;
     auto amplitude = [](uint32_t b) { return blockData(b).nEntries ? int(blockData(b).entries[0].amplitude) : 0; };
