@@ -51,10 +51,12 @@ static void sibilantBands(const uint32_t* magnitudes, uint32_t count, double bin
     }
 }
 
+static bool sibilantBandsPass(uint64_t low, uint64_t high) { return high >= SIBILANT_MIN_HIGH_BAND && high > low; }
+
 int isSibilantRow(const uint32_t* magnitudes, uint32_t count, double binWidth) {
     uint64_t low, high;
     sibilantBands(magnitudes, count, binWidth, &low, &high);
-    return high >= SIBILANT_MIN_HIGH_BAND && high > low;
+    return sibilantBandsPass(low, high);
 }
 
 // The high band of the background: the SIBILANT_FLOOR_PERCENT-th percentile of the rows' high
@@ -99,10 +101,9 @@ void appendSibilants(uint32_t from, uint32_t end) {
     for (uint32_t b = from; b < end; b++) {
         int r = rows[b - from];
         if (r < 0 || blockPitch(b) > 0.0) continue;
-        const uint32_t* row = spectrogramRow(uint32_t(r));
         uint64_t low, high;
-        sibilantBands(row, s.binsPerRow, s.binWidth, &low, &high);
-        sibilant[b - from] = isSibilantRow(row, s.binsPerRow, s.binWidth) && high >= SIBILANT_FLOOR_FACTOR * floor;
+        sibilantBands(spectrogramRow(uint32_t(r)), s.binsPerRow, s.binWidth, &low, &high);
+        sibilant[b - from] = sibilantBandsPass(low, high) && high >= SIBILANT_FLOOR_FACTOR * floor;
     }
     uint32_t windowFirst = ftBlockWindow.firstBlock;
     for (uint32_t b = from; b < end;) {

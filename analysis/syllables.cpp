@@ -104,20 +104,21 @@ static void vowelChangeStarts(const SyllableCues& c, std::vector<size_t>& starts
     size_t side = std::max<size_t>(1, size_t(VOWEL_SIDE_SECONDS / rowSeconds + 0.5));
     if (n < 2 * side + 2) return;
     double loudest = *std::max_element(c.levels.begin(), c.levels.end());
-    // Running sums of the colours make every side's mean one subtraction.
-    std::vector<std::vector<double>> running(n + 1, std::vector<double>(VOWEL_BANDS, 0.0));
+    // Running sums of the colours (row r's sums at r x VOWEL_BANDS) make every side's mean one
+    // subtraction.
+    const size_t bands = size_t(VOWEL_BANDS);
+    std::vector<double> running((n + 1) * bands, 0.0);
     for (size_t r = 0; r < n; r++)
-        for (int k = 0; k < VOWEL_BANDS; k++) running[r + 1][size_t(k)] = running[r][size_t(k)] + c.colours[r][size_t(k)];
+        for (size_t b = 0; b < bands; b++) running[(r + 1) * bands + b] = running[r * bands + b] + c.colours[r][b];
     std::vector<double> change(n, 0.0);
     for (size_t r = side; r + side <= n; r++) {
         double sum = 0.0;
-        for (int k = 0; k < VOWEL_BANDS; k++) {
-            size_t b = size_t(k);
-            double before = (running[r][b] - running[r - side][b]) / double(side);
-            double after = (running[r + side][b] - running[r][b]) / double(side);
+        for (size_t b = 0; b < bands; b++) {
+            double before = (running[r * bands + b] - running[(r - side) * bands + b]) / double(side);
+            double after = (running[(r + side) * bands + b] - running[r * bands + b]) / double(side);
             sum += std::fabs(after - before);
         }
-        change[r] = sum / VOWEL_BANDS;
+        change[r] = sum / double(bands);
     }
     for (size_t r = side + 1; r + side < n; r++) {
         if (change[r] < VOWEL_CHANGE_DB || change[r] < change[r - 1] || change[r] <= change[r + 1]) continue;
