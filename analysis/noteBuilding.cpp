@@ -512,6 +512,15 @@ static void startAtLoudnessLeap(NoteCandidate& c, uint32_t limit, uint32_t windo
     }
 }
 
+// A note split at a syllable sounds its own pitch in each part: the candidate took in the
+// slivers beside it (a short last note after a slow attack, a scoop), so a part made mostly of
+// them would otherwise show the candidate's pitch over audio a semitone away. Each part is
+// measured over its own blocks around the candidate's pitch.
+static void setPartPitch(Note& part, uint32_t partFirst, uint32_t partEnd, double candidatePitch) {
+    part.pitch = float(notePitch(partFirst, partEnd, candidatePitch));
+    part.midiNote = uint8_t(frequencyToSemitone(part.pitch));
+}
+
 static void measureCandidate(NoteCandidate& c) {
     c.volumeSum = 0;
     c.largest = 0;
@@ -652,6 +661,7 @@ uint32_t buildNotes(uint32_t fromSample, int notesToDrop) {
             double t = times[b - first];
             if (t - times[partFirst - first] < inside || times[c.end - first] - t < inside) continue;
             Note part = note;
+            setPartPitch(part, partFirst, b, c.pitch);
             part.waveStart = part.midiStart = float(times[partFirst - first]);
             part.waveEnd = part.midiEnd = float(t);
             part.recognitionCode |= NOTE_SPLIT_AT_SYLLABLE;
@@ -665,6 +675,7 @@ uint32_t buildNotes(uint32_t fromSample, int notesToDrop) {
             if (!validateNoteTimes(noteList.count - 1, false)) removeNote(noteList.count - 1);
             partFirst = b;
         }
+        if (partFirst != c.first) setPartPitch(note, partFirst, c.end, c.pitch);
         note.waveStart = note.midiStart = float(times[partFirst - first]);
         note.recognitionExtra[0] = partFirst;
         note.recognitionExtra[1] = c.end - partFirst;

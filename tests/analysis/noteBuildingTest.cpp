@@ -258,6 +258,24 @@ TEST_F(NoteBuilding, ANoteSplitsAtASyllableStartWellInsideIt) {
     EXPECT_TRUE(noteList.notes[0].recognitionCode & NOTE_SPLIT_AT_SYLLABLE);
 }
 
+TEST_F(NoteBuilding, EachPartOfASplitNoteSoundsItsOwnPitch) {
+    instrumentDefinitions.definitions.push_back(sineDefinition("Flute", 73, 60, 96));
+    globalSettings.defaultInstrument = "Flute";
+    makeSong(90);
+    // A short last note (0.08 s, under a flute's shortest note) joins the note before as its
+    // end; the syllable start parts them again, and the part shows the pitch its blocks hold.
+    setPitches(0, 61, 740.0);
+    setPitches(61, 68, 784.0);
+    blockData(59).blockFlags |= BLOCK_SYLLABLE_START;
+    buildNotes(0, 0);
+    ASSERT_EQ(noteList.count, 2);
+    EXPECT_NEAR(noteList.notes[0].pitch, 740.0, 0.01);
+    EXPECT_EQ(noteList.notes[0].midiNote, 78);
+    EXPECT_NEAR(noteList.notes[1].waveStart, blockTime(59), 1e-6);
+    EXPECT_NEAR(noteList.notes[1].pitch, 784.0, 0.01);
+    EXPECT_EQ(noteList.notes[1].midiNote, 79);
+}
+
 TEST_F(NoteBuilding, WithoutFindSyllablesNothingSplits) {
     makeSong(120);
     recognitionOptions.findSyllables = false;
