@@ -112,12 +112,14 @@ int64_t freeDiskSpace(const std::string& folder) {
 
 void setFreeDiskSpaceOverride(int64_t bytes) { freeSpaceOverride = bytes; }
 
-struct InstanceLock {
+// A class name is shared by the whole program: one used again elsewhere (a test fixture) would
+// share this one's inline constructor, so the state classes of this layer end in "State".
+struct InstanceLockState {
     int descriptor = -1;    // "!InUse", open and flocked while this copy runs
     std::string path;       // where it lies, for the removal at shut-down
     pid_t owner = 0;        // the process that took it; a forked child is another copy
 };
-static InstanceLock instanceLock;
+static InstanceLockState instanceLock;
 
 int takeInstanceLock(const std::string& path) {
     if (instanceLockHeld()) return INSTANCE_LOCK_TAKEN;

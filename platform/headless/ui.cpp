@@ -9,13 +9,15 @@
 
 static const UiBackend* installedBackend = nullptr;   // nullptr: headless
 
-struct HeadlessUi {
+// A class name is shared by the whole program: one used again elsewhere (a test fixture) would
+// share this one's inline constructor, so the state classes of this layer end in "State".
+struct HeadlessUiState {
     std::mutex lock;                  // the worker threads report too
     std::vector<UiCall> calls;        // every call since clearUiCalls
     std::deque<int> answers;          // preset answers of the next Yes/No boxes
     bool echo = false;                // copy boxes to stderr
 };
-static HeadlessUi headlessUi;
+static HeadlessUiState headlessUi;
 
 static const char* kindWord(int kind) {
     switch (kind) {
