@@ -382,21 +382,6 @@ int learnNoteSample(const LearningRecording& recording, uint32_t start, uint32_t
 
 // ---- analysing a recording ----
 
-struct WaveSource {
-    WaveReadInfo* info;      // the open file, positioned in its data
-    uint32_t samplesLeft;    // frames of the data chunk not read yet
-};
-
-static uint32_t readWaveSource(void* context, uint8_t* destination, uint32_t count) {
-    WaveSource& s = *static_cast<WaveSource*>(context);
-    uint32_t bytesPerSample = s.info->format->bitsPerSample / 8u;
-    uint32_t wanted = std::min(count, s.samplesLeft);
-    if (wanted == 0) return 0;
-    uint32_t got = downmixFrames(s.info->file, *s.info->format, destination, wanted * bytesPerSample) / bytesPerSample;
-    s.samplesLeft = got < wanted ? 0 : s.samplesLeft - got;
-    return got;
-}
-
 struct BlockCollector {
     LearningRecording* recording;   // receives each chunk's dataBuffers
     int outOfMemory;                // a copy could not be made
@@ -460,9 +445,9 @@ int analyseLearningFile(const std::string& path, LearningRecording* recording) {
         showMessage(MESSAGE_ERROR, "File could not be seeked");
         return 0;
     }
-    WaveSource source{&info, info.dataSamples == WAVE_UNKNOWN ? 0 : info.dataSamples};
+    WaveFrameSource source{&info, info.dataSamples == WAVE_UNKNOWN ? 0 : info.dataSamples};
     BlockCollector collector{recording, 0};
-    int analysed = analyseSource(readWaveSource, &source, collectBlocks, &collector);
+    int analysed = analyseSource(readWaveFrameSource, &source, collectBlocks, &collector);
     if (collector.outOfMemory) showMessage(MESSAGE_ERROR, resourceString(10401));
     if (!analysed) recording->blocks.clear();
     return analysed;

@@ -236,3 +236,13 @@ uint32_t downmixFrames(FILE* file, const WaveFormatRecord& format, void* destina
     if (filled < outputBytes) std::memset(out + filled, silence, outputBytes - filled);
     return filled;
 }
+
+uint32_t readWaveFrameSource(void* context, uint8_t* destination, uint32_t count) {
+    WaveFrameSource& s = *static_cast<WaveFrameSource*>(context);
+    uint32_t bytesPerSample = s.info->format->bitsPerSample / 8u;
+    uint32_t wanted = std::min(count, s.samplesLeft);
+    if (wanted == 0) return 0;
+    uint32_t got = downmixFrames(s.info->file, *s.info->format, destination, wanted * bytesPerSample) / bytesPerSample;
+    s.samplesLeft = got < wanted ? 0 : s.samplesLeft - got;
+    return got;
+}

@@ -82,3 +82,13 @@ uint32_t openCheckedWaveFile(WaveReadInfo* info, const std::string& path);
 // last frame) becomes silence. A multi-channel format of other sizes than 8 or 16 bits
 // leaves the destination as it was. Returns the output bytes that came from the file.
 uint32_t downmixFrames(FILE* file, const WaveFormatRecord& format, void* destination, uint32_t outputBytes);
+
+// An opened wave file as a source of one-channel samples for the analysis: the open file,
+// positioned in its data, and the frames of its data chunk not read yet.
+struct WaveFrameSource {
+    WaveReadInfo* info;
+    uint32_t samplesLeft;
+};
+// The analysis' sample reader over a WaveFrameSource (context): up to count downmixed samples
+// into destination; the number read, 0 at the end of the data.
+uint32_t readWaveFrameSource(void* context, uint8_t* destination, uint32_t count);

@@ -34,21 +34,6 @@ static const char* const USAGE_TEXT =
     "melodrift-cli: analyse: expected IN.wav [--pitch-range 0|1|2] [--enhanced] [--boost] [--ft-csv FILE] "
     "[--notes-csv FILE] [--pitch-csv FILE]\n";
 
-struct WaveSource {
-    WaveReadInfo* info;      // the open file, positioned in its data
-    uint32_t samplesLeft;    // frames of the data chunk not read yet
-};
-
-static uint32_t readWaveSource(void* context, uint8_t* destination, uint32_t count) {
-    WaveSource& s = *static_cast<WaveSource*>(context);
-    uint32_t bytesPerSample = s.info->format->bitsPerSample / 8;
-    uint32_t wanted = count < s.samplesLeft ? count : s.samplesLeft;
-    if (wanted == 0) return 0;
-    uint32_t got = downmixFrames(s.info->file, *s.info->format, destination, wanted * bytesPerSample) / bytesPerSample;
-    s.samplesLeft = got < wanted ? 0 : s.samplesLeft - got;
-    return got;
-}
-
 struct AnalyseOutputs {
     FILE* ftCsv;                // the FT table, or nullptr
     std::vector<float> pitch;   // Hz of each block after recognition, 0 when unpitched
@@ -181,8 +166,8 @@ int runAnalyseCommand(const std::vector<std::string>& arguments) {
     if (setupFrequencyAnalysis() && openFTFile(FT_UPDATE)) {
         if (openHiresFTFile(FT_UPDATE)) {
             fileSeek(info.file, info.dataOffset, SEEK_SET);
-            WaveSource source{&info, info.dataSamples};
-            analysed = analyseWithRecognition(readWaveSource, &source, chunkDone, &out, &times, &recognitionSeconds);
+            WaveFrameSource source{&info, info.dataSamples};
+            analysed = analyseWithRecognition(readWaveFrameSource, &source, chunkDone, &out, &times, &recognitionSeconds);
             if (analysed) keepRecognisedPitches(out);
             closeHiresFTFile(1);
         }
