@@ -56,7 +56,7 @@ std::vector<double> rowColour(const uint32_t* magnitudes, uint32_t count, double
 struct SyllableCues {
     uint32_t firstRow;
     std::vector<int> blockOfRow;     // song block whose middle lies in the row's hop, -1 when none
-    std::vector<double> totals;      // magnitudes from the fourth bin up
+    std::vector<double> totals;      // loudness: magnitudes from the fourth bin up to the loudness limit
     std::vector<double> ratios;      // brightness ratios
     std::vector<std::vector<double>> colours;   // rowColour of each row
     std::vector<double> levels;      // each row's level over the colour bands, dB
@@ -238,7 +238,7 @@ void findSyllables(uint32_t from, uint32_t end) {
     for (size_t k = 0; k < n; k++) {
         const uint32_t* row = spectrogramRow(firstRow + uint32_t(k));
         double total = 0.0;
-        for (uint32_t i = 3; i < s.binsPerRow; i++) total += row[i];
+        for (uint32_t i = 3; i < s.binsPerRow && (i + 1) * s.binWidth <= SYLLABLE_LOUDNESS_LIMIT_HZ; i++) total += row[i];
         c.totals[k] = total;
         if (++sinceRefresh >= refresh && c.blockOfRow[k] >= 0 && blockPitch(uint32_t(c.blockOfRow[k])) > 0.0) {
             estimate = blockPitch(uint32_t(c.blockOfRow[k]));

@@ -13,6 +13,10 @@ constexpr double SYLLABLE_BRIGHT_PITCH_HZ = 524.0;      // fundamentals above it
 constexpr double SYLLABLE_ESTIMATE_SECONDS = 0.02;      // the fundamental estimate is refreshed at most this often
 constexpr double SYLLABLE_DEFAULT_PITCH_HZ = 200.0;     // estimate before any pitch is known
 constexpr float SYLLABLE_SPIKE_THRESHOLD = 0.6666667f;  // the robust maximum of the row totals
+// A row's loudness: its magnitudes from the fourth bin up to SYLLABLE_LOUDNESS_LIMIT_HZ, where
+// a voice has its harmonics and formants. Hiss spreads evenly up to half the sample rate, and
+// summed over the whole row it fills in the dips the voice makes.
+constexpr double SYLLABLE_LOUDNESS_LIMIT_HZ = 5000.0;
 // Energy dips: a valley of the row totals (smoothed over three rows) whose loudness on both
 // sides, within DIP_REACH_SECONDS, is at least DIP_DEPTH times the valley (6 dB: a voiced
 // consonant such as l, m or n between two vowels, or a re-attacked note) and at least

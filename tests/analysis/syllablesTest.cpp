@@ -32,6 +32,24 @@ TEST_F(SyllableStarts, ADeepLoudnessDipBetweenTwoLoudStretchesStartsASyllable) {
     EXPECT_EQ(marked, 1);
 }
 
+TEST_F(SyllableStarts, HissAboveTheVoiceDoesNotFillADip) {
+    makeSong(BLOCKS);
+    setPitches(0, BLOCKS, 200.0);
+    // Steady hiss from 6 kHz up, twice the voice's loud rows in all: over the whole row the dip
+    // would be 300000 to 225000.
+    const MagnitudeSpectrogram& s = magnitudeSpectrogram;
+    uint32_t hissFrom = binOf(6000.0), hissBins = s.binsPerRow - hissFrom;
+    ASSERT_GT(hissBins, 100u);
+    makeRows(2 * BLOCKS, [&](uint32_t r, uint32_t* row) {
+        voicedRow(row, r >= 200 && r < 208 ? 25000u : 100000u, 1000);
+        for (uint32_t i = hissFrom; i < s.binsPerRow; i++) row[i] = 200000u / hissBins;
+    });
+    findSyllables(0, BLOCKS);
+    ASSERT_EQ(syllables.startBlocks.size(), 1u);
+    EXPECT_GE(syllables.startBlocks[0], 99u);
+    EXPECT_LE(syllables.startBlocks[0], 100u);
+}
+
 TEST_F(SyllableStarts, TwoStartsLessThanFifteenHundredthsApartKeepTheEarlier) {
     // Dips at rows 200, 220 (0.116 s later: a consonant and the vowel it opens) and 260.
     auto quiet = [](uint32_t r) { return (r >= 200 && r < 206) || (r >= 220 && r < 226) || (r >= 260 && r < 266); };
