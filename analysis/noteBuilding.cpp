@@ -10,8 +10,9 @@
 #include <vector>
 
 #include "analysis/analysisGeometry.h"
+#include "analysis/bandEnergy.h"
 #include "analysis/instrumentDefinitions.h"
-#include "analysis/noteRecognition.h"
+#include "analysis/recognitionBlocks.h"
 #include "analysis/pitchFlattening.h"
 #include "analysis/pitchScale.h"
 #include "analysis/recognitionOptions.h"

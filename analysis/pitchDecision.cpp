@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "analysis/analysisGeometry.h"
+#include "analysis/bandEnergy.h"
 #include "analysis/mainsHum.h"
 #include "analysis/pitchScale.h"
 #include "analysis/recognitionOptions.h"

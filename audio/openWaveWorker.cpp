@@ -19,6 +19,7 @@
 #include "analysis/analysisSampleBuffer.h"
 #include "analysis/frequencyAnalysis.h"
 #include "analysis/frequencyTable.h"
+#include "analysis/noteBuilding.h"
 #include "analysis/noteRecognition.h"
 #include "analysis/recognitionOptions.h"
 #include "analysis/spectrogram.h"

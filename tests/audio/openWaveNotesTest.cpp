@@ -9,6 +9,7 @@
 
 #include "analysis/frequencyAnalysis.h"
 #include "analysis/noteRecognition.h"
+#include "analysis/wholeSongAnalysis.h"
 #include "analysis/recognitionOptions.h"
 #include "analysis/signalGenerator.h"
 #include "audio/audioActivity.h"
@@ -19,6 +20,7 @@
 #include "platform/files.h"
 #include "platform/mainloop.h"
 #include "platform/ui.h"
+#include "shell/closeSong.h"
 #include "shell/paths.h"
 #include "shell/settings.h"
 #include "store/ftBlockStore.h"
