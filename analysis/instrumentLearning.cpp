@@ -428,13 +428,14 @@ int analyseLearningFile(const std::string& path, LearningRecording* recording) {
         showMessage(MESSAGE_ERROR, RATE_TOO_HIGH_TEXT);
         return 0;
     }
-    // The song's stores are emptied and the learning mark taken off on every return.
+    // The song's stores are emptied and the learning mark taken off on every return (the pass
+    // makes no notes).
     struct EndLearningPass {
         bool marked;
         ~EndLearningPass() {
             releaseFrequencyAnalysis();
             recognitionOptions.learningInstruments = marked;
-            closeSong();
+            closeSongStores();
         }
     } endPass{recognitionOptions.learningInstruments};
     recognitionOptions.learningInstruments = true;

@@ -17,7 +17,6 @@
 #include "analysis/pitchScale.h"
 #include "analysis/recognitionOptions.h"
 #include "notes/noteList.h"
-#include "playback/midiOutput.h"
 #include "store/song.h"
 
 SongInstruments songInstruments;

@@ -23,7 +23,8 @@
 #include "analysis/noteRecognition.h"
 #include "analysis/recognitionOptions.h"
 #include "analysis/spectrogram.h"
-#include "audio/openWaveFile.h"
+#include "audio/audioActivity.h"
+#include "audio/levelMeter.h"
 #include "audio/waveWorkingFile.h"
 #include "notes/noteList.h"
 #include "platform/clock.h"
@@ -32,14 +33,15 @@
 #include "platform/sync.h"
 #include "platform/ui.h"
 #include "resources/strings.h"
-#include "shell/mainFrame.h"
 #include "shell/paths.h"
 #include "store/fileRoutines.h"
 #include "store/ftBlockStore.h"
 #include "store/hiresFTBlockStore.h"
 #include "store/song.h"
+#include "store/songWindowHooks.h"
 #include "store/undo.h"
 
+OpeningState openingState;
 OpeningProgress openingProgress;
 
 static const char* const THREAD_OPEN_TEXT_1 = "Input Wave file could not be opened by CSOpenWaveFileDataThread (1)";
@@ -300,7 +302,7 @@ static void redrawBetweenChunks() {
         int expected = REDRAW_POSTED;
         if (!p.redrawState.compare_exchange_strong(expected, REDRAW_RUNNING)) return;   // withdrawn
         uint32_t start = clockMilliseconds();
-        redrawSongView();
+        songWindowHooks.redrawSongView();
         p.redrawTook = clockMilliseconds() - start;
         p.redrawStartedAt = start;
         p.redrawState = REDRAW_IDLE;
@@ -411,4 +413,11 @@ void CSOpenWaveFileDataThread() {
         redrawBetweenChunks();
     }
     finishOpening();
+}
+
+void openingEnded() {
+    joinWorker(openingState.worker);
+    audioActivity.opening = false;
+    songWindowHooks.redrawSongView();
+    songWindowHooks.updateFrameDisplay();   // the status bar no longer says the song is being opened
 }

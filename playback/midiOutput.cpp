@@ -28,10 +28,6 @@ static const int MAX_MIDI_KEY = 127;
 
 void resetMidiOutput() { midiOutputSong = MidiOutputSong{}; }
 
-std::string songInstrumentName() {
-    return midiOutputSong.instrumentName.empty() ? globalSettings.defaultInstrument : midiOutputSong.instrumentName;
-}
-
 int velocityFromLevel(float level) {
     float a = level >= 1.0f ? level : 1.0f;   // also catches not-a-number
     double v = 127.0 * std::pow(double(a * 0.003921569f), 0.30103) + 0.5;

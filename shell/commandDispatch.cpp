@@ -5,20 +5,11 @@
 #include "audio/audioActivity.h"
 #include "audio/openWaveFile.h"
 #include "notes/displayModes.h"
-#include "playback/midiOutput.h"
 #include "platform/ui.h"
 #include "shell/commandTable.h"
 #include "shell/mainFrame.h"
 #include "shell/menuEnabling.h"
 #include "shell/zoom.h"
-
-// The operations this build has, filled as their owners are built.
-CommandOperations commandOperations = [] {
-    CommandOperations operations{};
-    operations.openWaveFile = openWaveFile;
-    operations.writeNotesMidiFile = saveMidiFile;
-    return operations;
-}();
 
 std::string notAvailableText(const std::string& what) {
     return what + " is not available in this version of Torvellan Melodrift.";

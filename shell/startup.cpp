@@ -14,6 +14,7 @@
 #include "platform/sync.h"
 #include "platform/ui.h"
 #include "shell/appTimers.h"
+#include "shell/closeSong.h"
 #include "shell/mainFrame.h"
 #include "shell/openQueue.h"
 #include "shell/paths.h"

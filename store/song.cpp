@@ -1,10 +1,12 @@
-// The song record and its time axis. Block durations start at the nominal duration and are
-// changed per block by timing edits, so the time of a block is always a sum of durations.
+// The song record, its time axis and its names. Block durations start at the nominal duration
+// and are changed per block by timing edits, so the time of a block is always a sum of durations.
 #include "store/song.h"
 
 #include <cmath>
 #include <new>
 #include <stdexcept>
+
+#include "shell/settings.h"
 
 Song song;
 
@@ -17,6 +19,7 @@ void resetSong() {
     std::vector<double>().swap(song.sampleBlockDurations);
     song.waveFormat = SongWaveFormat{};
     song.workingWaveBytes = 0;
+    song.instrumentName.clear();
 }
 
 int growSampleBlockDurations(uint32_t blocks) {
@@ -81,3 +84,18 @@ double snapTimeToBlock(double t, uint32_t startBlock, double startTime) {
 }
 
 double songDuration() { return songTimeOfBlock(song.blockCount); }
+
+SongNames songNames;
+
+void resetSongNames() { songNames = SongNames{}; }
+
+void setSongNamesFromFile(const std::string& path) {
+    std::string name = path;
+    size_t dot = name.rfind('.');
+    if (dot != std::string::npos && dot + 4 >= name.size()) name.erase(dot);
+    for (std::string& remembered : songNames.remembered) remembered = name;
+}
+
+std::string songInstrumentName() {
+    return song.instrumentName.empty() ? globalSettings.defaultInstrument : song.instrumentName;
+}

@@ -15,10 +15,10 @@
 #include "platform/files.h"
 #include "platform/ui.h"
 #include "resources/generalMidi.h"
+#include "shell/closeSong.h"
 #include "shell/paths.h"
 #include "shell/settings.h"
 #include "store/song.h"
-#include "store/workingFiles.h"
 #include "support/testSupport.h"
 
 using Bytes = std::vector<uint8_t>;

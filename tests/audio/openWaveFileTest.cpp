@@ -21,6 +21,7 @@
 #include "platform/mainloop.h"
 #include "platform/sync.h"
 #include "platform/ui.h"
+#include "shell/closeSong.h"
 #include "shell/mainFrame.h"
 #include "shell/paths.h"
 #include "shell/saveSong.h"
@@ -28,7 +29,6 @@
 #include "store/ftBlockStore.h"
 #include "store/hiresFTBlockStore.h"
 #include "store/song.h"
-#include "store/workingFiles.h"
 #include "support/testSupport.h"
 
 namespace {

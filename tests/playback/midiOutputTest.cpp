@@ -164,7 +164,7 @@ TEST_F(MidiOutputFile, ASongWithoutNotesGivesTheTempoTrackAndOneInstrumentTrackW
 
 TEST_F(MidiOutputFile, TheTrackCarriesTheSongsInstrumentItsProgramAndTheReverbOption) {
     makeSong(640, 1.0 / 64);
-    midiOutputSong.instrumentName = "Fl\xC3\xBBte";   // matched by word, written in Latin-1
+    song.instrumentName = "Fl\xC3\xBBte";   // matched by word, written in Latin-1
     midiOutputOptions.reverb = false;
     ReadMidiFile file = writeAndRead(0);
     ASSERT_EQ(file.tracks.size(), 2u);
@@ -179,7 +179,7 @@ TEST_F(MidiOutputFile, TheTrackCarriesTheSongsInstrumentItsProgramAndTheReverbOp
     ASSERT_EQ(programs.size(), 1u);
     EXPECT_EQ(programs[0].data1, 1 - 1) << "an unknown name plays the first program";
 
-    midiOutputSong.instrumentName = "Flute";
+    song.instrumentName = "Flute";
     midiOutputOptions.reverb = true;
     midiOutputOptions.reverbDepth = 90;
     file = writeAndRead(0);

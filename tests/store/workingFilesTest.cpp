@@ -5,6 +5,7 @@
 #include "notes/selection.h"
 #include "platform/files.h"
 #include "platform/ui.h"
+#include "shell/closeSong.h"
 #include "shell/paths.h"
 #include "store/ftBlockStore.h"
 #include "store/song.h"
