@@ -11,8 +11,6 @@
 #include <cstring>
 #include <memory>
 #include <mutex>
-#include <new>
-#include <stdexcept>
 #include <thread>
 
 #include "analysis/analysisGeometry.h"
@@ -27,6 +25,7 @@
 #include "audio/levelMeter.h"
 #include "audio/waveWorkingFile.h"
 #include "notes/noteList.h"
+#include "platform/allocation.h"
 #include "platform/clock.h"
 #include "platform/files.h"
 #include "platform/mainloop.h"
@@ -122,12 +121,7 @@ static int fillChunkBuffer(WaveReadInfo& info, uint32_t count, bool firstChunk, 
         o.bufferFirstSample += drop;
     }
     size_t wanted = kept + size_t(count) * bps;
-    try {
-        if (o.chunkBuffer.size() < wanted) o.chunkBuffer.resize(wanted);
-    } catch (const std::bad_alloc&) {
-        showMessage(MESSAGE_ERROR, resourceString(10401));
-        return 0;
-    } catch (const std::length_error&) {
+    if (o.chunkBuffer.size() < wanted && !tryResize(o.chunkBuffer, wanted)) {
         showMessage(MESSAGE_ERROR, resourceString(10401));
         return 0;
     }

@@ -3,9 +3,8 @@
 #include "store/song.h"
 
 #include <cmath>
-#include <new>
-#include <stdexcept>
 
+#include "platform/allocation.h"
 #include "shell/settings.h"
 
 Song song;
@@ -29,14 +28,7 @@ int growSampleBlockDurations(uint32_t blocks) {
     if (song.sampleBlockDuration > 0.0) step = uint32_t(300.0 / song.sampleBlockDuration);
     if (step == 0) step = 1;
     size_t steps = (blocks - length + step - 1) / step;
-    try {
-        song.sampleBlockDurations.resize(length + steps * step, 0.0);
-    } catch (const std::bad_alloc&) {
-        return 0;
-    } catch (const std::length_error&) {
-        return 0;
-    }
-    return 1;
+    return tryResize(song.sampleBlockDurations, length + steps * step, 0.0) ? 1 : 0;
 }
 
 double songTimeOfBlock(uint32_t n, uint32_t from) {

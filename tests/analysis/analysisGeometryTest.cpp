@@ -164,7 +164,7 @@ TEST_F(AnalysisGeometrySetup, ASongWithoutAUsableFormatIsNotSetUp) {
 
 TEST_F(AnalysisGeometrySetup, WorkingBuffersThatCannotBeHadAreAllReleasedAfterTheMemoryMessage) {
     setSongFormat(44100, 16);
-    failAnalysisAllocation(5);
+    failAllocation(5);
     EXPECT_EQ(setupFrequencyAnalysis(), 0);
     EXPECT_EQ(lastMessageText(),
               "Sorry - there is insufficient memory available to continue. Please try freeing up some memory from "

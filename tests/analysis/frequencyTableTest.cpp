@@ -227,9 +227,9 @@ TEST_F(FrequencyTableTest, WindowArraysThatCannotBeHadOnTheFirstChunkGiveTheMemo
     bytes = toSampleBytes(silenceSignal(1.0, RATE), 16);
     ASSERT_EQ(setupFrequencyAnalysis(), 1);
     setAnalysisSampleBuffer(bytes.data(), 44100, 0);
-    failFTAllocation(1);
+    failAllocation(1);
     EXPECT_EQ(createFrequencyTable(0), -1);
-    failFTAllocation(0);
+    failAllocation(0);
     EXPECT_EQ(lastMessageText().rfind("Sorry - there is insufficient memory available to continue.", 0), 0u);
     EXPECT_EQ(song.blockCount, 0u);
 }

@@ -269,7 +269,7 @@ TEST_F(InstrumentFile, BytesAfterTheLastDefinitionAreRefused) {
 
 TEST_F(InstrumentFile, AFailedAllocationGivesTheMemoryMessageAndAnEmptyTable) {
     for (int n : {1, 2}) {
-        failInstrumentAllocation(n);
+        failAllocation(n);
         EXPECT_EQ(loadBytes(threeSemitoneFile()), 0) << n;
         EXPECT_EQ(lastMessageText(), resourceString(10401));
         EXPECT_TRUE(instrumentDefinitions.definitions.empty());

@@ -12,6 +12,7 @@
 
 #include "analysis/instrumentDefinitions.h"
 #include "analysis/recognitionOptions.h"
+#include "platform/allocation.h"
 #include "platform/files.h"
 #include "platform/ui.h"
 #include "resources/generalMidi.h"
@@ -35,14 +36,14 @@ protected:
         resetRecognitionOptions();
         setInstrumentDefinitionsFile(definitionsPath());
         freeInstrumentDefinitions();
-        failInstrumentAllocation(0);
+        failAllocation(0);
         clearFileFailures();
         clearUiCalls();
     }
     void TearDown() override {
         freeInstrumentDefinitions();
         setInstrumentDefinitionsFile("");
-        failInstrumentAllocation(0);
+        failAllocation(0);
         clearFileFailures();
         closeSong();
         resetRecognitionOptions();

@@ -150,7 +150,7 @@ TEST_F(SpectrogramTest, PowerSpectrumRowsShareThePlainTransformsScale) {
 
 TEST_F(SpectrogramTest, RowsThatCannotBeGrownGiveTheMemoryMessage) {
     holdWholeSignal(toneSignal(440.0, 8000.0, 1.0, 44100));
-    failSpectrogramAllocation(1);
+    failAllocation(1);
     EXPECT_EQ(createMagnitudeSpectrogram(0), -1);
     EXPECT_EQ(lastMessageText(),
               "Sorry - there is insufficient memory available to continue. Please try freeing up some memory from "

@@ -9,6 +9,7 @@
 #include <string>
 #include <vector>
 
+#include "platform/allocation.h"
 #include "platform/files.h"
 #include "platform/ui.h"
 #include "shell/paths.h"
@@ -156,7 +157,7 @@ protected:
         resetSong();
         clearUiCalls();
         clearFileFailures();
-        failFTAllocation(0);
+        failAllocation(0);
         fileDelete(ftPath());
         fileDelete(fiPath());
         fileDelete(sharedFilePath("CS.tw"));

@@ -128,7 +128,7 @@ TEST_F(FTBlockFormat, AWriteThatCannotGetItsMemoryWritesNothing) {
     TestBlock b = makeBlock(1, 2, 2, 2);
     for (int n = 1; n <= 3; n++) {
         ScratchFile out({}, "wb");
-        failFTAllocation(n);
+        failAllocation(n);
         EXPECT_EQ(writeFTBlock(out.f, 0, &b.data, &b.orig, &b.detected), 0u);
         EXPECT_EQ(lastMessageText(), texts[n - 1]);
         EXPECT_TRUE(out.bytes().empty());
@@ -230,7 +230,7 @@ TEST_F(FTBlockRead, AReadThatCannotGetItsMemoryStopsAtThatBuffer) {
     for (int n = 1; n <= 3; n++) {
         ScratchFile in(blockBytes(good));
         TestBlock back = sentinelBlock();
-        failFTAllocation(n);
+        failAllocation(n);
         EXPECT_EQ(readFTBlock(in.f, 0, &back.data, &back.orig, &back.detected), 0u);
         EXPECT_EQ(lastMessageText(), texts[n - 1]);
         TestBlock expected = sentinelBlock();

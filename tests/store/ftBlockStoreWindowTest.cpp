@@ -184,7 +184,7 @@ TEST_F(FTBlockWindowLoad, ACorruptBlockEndsTheWindowBeforeIt) {
 
 TEST_F(FTBlockWindowLoad, AWindowThatCannotGetItsMemoryShowsTheMemoryMessage) {
     storeModel(makeBlocks(20));
-    failFTAllocation(1);
+    failAllocation(1);
     EXPECT_EQ(loadFTBlockWindow(0, 1), 0);
     EXPECT_EQ(lastMessageText(),
               std::string("Sorry - there is insufficient memory available to continue. Please try freeing up some "

@@ -9,6 +9,7 @@
 #include <string>
 #include <vector>
 
+#include "platform/allocation.h"
 #include "platform/files.h"
 #include "platform/ui.h"
 #include "shell/paths.h"
@@ -67,7 +68,7 @@ protected:
         generalSettings.disableWaveEditing = false;
         clearUiCalls();
         clearFileFailures();
-        failHiresAllocation(0);
+        failAllocation(0);
         removeStoreFiles();
         scratchPath = folder.file("block");
         scratch = fileOpen(scratchPath, "wb+");
@@ -83,7 +84,7 @@ protected:
         freeFTBlockWindow();
         removeStoreFiles();
         clearFileFailures();
-        failHiresAllocation(0);
+        failAllocation(0);
         generalSettings = GeneralSettings{};
         hiresGeometry = HiresGeometry{};
         resetSong();
@@ -439,12 +440,12 @@ TEST_F(HiresFTMessages, BlocksOutsideTheWindowAreNotInMemory) {
 }
 
 TEST_F(HiresFTMessages, AllocationFailuresNameTheRecordOrTheArrays) {
-    failHiresAllocation(1);
+    failAllocation(1);
     EXPECT_EQ(allocCompressedHiresBuffer(0), nullptr);
     EXPECT_EQ(lastMessageText(), "Could not allocate compressed hires buffer - allocCompressedHiresBuffer (1)");
     for (int array = 2; array <= 4; array++) {
         clearUiCalls();
-        failHiresAllocation(array);
+        failAllocation(array);
         EXPECT_EQ(allocCompressedHiresBuffer(0), nullptr);
         EXPECT_EQ(lastMessageText(), "Could not allocate compressed hires buffer - allocCompressedHiresBuffer (2)");
     }
@@ -452,7 +453,7 @@ TEST_F(HiresFTMessages, AllocationFailuresNameTheRecordOrTheArrays) {
     ftBlockWindow.endBlock = 2;
     ftBlockWindow.capacity = 2;
     craftScratch(storedBlock(0, 1.0f, 0.0f, {}, {}));
-    failHiresAllocation(1);
+    failAllocation(1);
     EXPECT_EQ(readHiresFTBlock(scratch, 0, 1, nullptr, nullptr), 0u);
     EXPECT_EQ(lastMessageText(), "Could not allocate Hires buffer - allocHiresBuffer (1)");
 }
