@@ -65,6 +65,10 @@ void resetSongInstruments();
 // fromSample to the song's end. Returns the sample position the next chunk's caller keeps.
 uint32_t buildNotes(uint32_t fromSample, int notesToDrop);
 
+// entryFlags bits 4 and 5: marks the instrument matching leaves on the entries a note has used.
+// Note building clears them, and restores the amplitudes, before it builds from a block again.
+constexpr uint8_t ENTRY_NOTE_MARKS = 0x30;
+
 // recognitionCode bits of a recognised note.
 constexpr uint32_t NOTE_MATCHED_IN_RANGE = 1;      // an instrument definition's range and sample fit it
 constexpr uint32_t NOTE_OUTSIDE_DEFINITIONS = 2;   // none fitted; it took the song's instrument
