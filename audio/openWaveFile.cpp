@@ -31,10 +31,6 @@
 // The source format while no file is open.
 static const WaveFormatRecord DEFAULT_SOURCE_FORMAT = {WAVE_FORMAT_PCM, 1, 44100, 88200, 2, 16, 0};
 
-// Undo snapshots arrive with the undo store; until then an opening takes none, and this
-// stands where the snapshot is taken.
-static void takeUndoSnapshotNotYetBuilt() {}
-
 static void releaseChunkBuffer() {
     OpeningState& o = openingState;
     std::vector<uint8_t>().swap(o.chunkBuffer);
@@ -164,7 +160,8 @@ int openWaveFile(const std::string& path) {
     audioActivity.opening = true;
     audioActivity.openingSeconds =
         o.sourceDuration + (song.waveFormat.samplesPerSec ? double(o.samplesBefore) / song.waveFormat.samplesPerSec : 0.0);
-    takeUndoSnapshotNotYetBuilt();
+    // The undo snapshot of the opening is taken here, before the worker starts: it is the
+    // undo store's to take, and this build has none yet.
     startWorker(o.worker, CSOpenWaveFileDataThread);
     if (!appending) setSongNamesFromFile(path);
     return 1;

@@ -1,5 +1,5 @@
 #pragma once
-// Allocations the engine survives failing. Where a buffer cannot be had the design gives a
+// Allocations the engine survives failing. Where a buffer cannot be had the user gets a
 // message, not a crash, so every growing allocation goes through these helpers: they turn a
 // failure (std::bad_alloc, or a size beyond what a vector can hold) into false. Tests make the
 // Nth allocation from now fail, as they make file calls fail (platform/files.h).

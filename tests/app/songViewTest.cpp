@@ -120,7 +120,7 @@ private slots:
         QImage image = paintKnownSong();
         int y = semitoneLineY(67) + 3;
         QColor inside = pixel(image, timeToX(1.5), y);
-        QCOMPARE(inside, QColor(0xdc, 0xe7, 0xf2));
+        QCOMPARE(inside, songViewColours().timeSelectionOpaque);
         QCOMPARE(pixel(image, timeToX(1.0), y), songViewColours().timeSelection);   // its left edge
         QCOMPARE(pixel(image, timeToX(2.5), y), songViewColours().plot);
         QCOMPARE(pixel(image, timeToX(0.5), y), songViewColours().plot);
