@@ -4,6 +4,8 @@
 // table's deletion rules, the chord limits, the nearest note and the instrument window's line.
 #include <gtest/gtest.h>
 
+#include <filesystem>
+
 #include <cstdint>
 #include <cstring>
 #include <string>

@@ -6,7 +6,6 @@
 
 #include <cmath>
 #include <cstring>
-#include <filesystem>
 #include <limits>
 #include <string>
 #include <vector>
@@ -26,7 +25,6 @@
 #include "store/song.h"
 #include "support/testSupport.h"
 
-namespace fs = std::filesystem;
 using Bytes = std::vector<uint8_t>;
 
 static const char* const CREDIT_LINE = "Made with Torvellan Melodrift";
@@ -39,19 +37,16 @@ struct DetailBlock {
     uint8_t amplitude;
 };
 
-class MidiOutputTest : public ::testing::Test {
+class MidiOutputTest : public SharedFolderTest {
 protected:
     void SetUp() override {
-        savedPaths = paths;
-        setSharedBasePath(folder.path());
-        makeFolder(paths.sharedFolder);
-        // The shipped General MIDI list of this source tree.
-        paths.resourcePath = fs::path(__FILE__).parent_path().parent_path().parent_path().string() + "/";
+        SharedFolderTest::SetUp();
+        paths.resourcePath = sourceRoot();   // the shipped General MIDI list
         clean();
     }
     void TearDown() override {
         clean();
-        paths = savedPaths;
+        SharedFolderTest::TearDown();
     }
     void clean() {
         closeFTFile(0);
@@ -63,9 +58,7 @@ protected:
         resetGeneralMidiTable();
         midiOutputOptions = MidiOutputOptions{};
         globalSettings.defaultInstrument = "Voice";
-        audioActivity = AudioActivity{false, false};
-        clearUiCalls();
-        clearFileFailures();
+        audioActivity = AudioActivity{};
     }
     // A song of count blocks of d seconds each.
     void makeSong(uint32_t count, double d) {
@@ -120,8 +113,6 @@ protected:
         EXPECT_EQ(file.error, "");
         return file;
     }
-    TempFolder folder;
-    Paths savedPaths;
     std::string path = folder.file("song.mid");
 };
 
@@ -216,19 +207,11 @@ TEST_F(MidiOutputFile, SeveralPartsGetATrackEachAndTheTenthChannelIsSkipped) {
 
 // ---- velocities ----
 
-TEST(MidiOutputVelocity, LevelsGiveTheVelocitiesOfTheirCurve) {
-    EXPECT_EQ(velocityFromLevel(0.0f), 24);
-    EXPECT_EQ(velocityFromLevel(1.0f), 24);
-    EXPECT_EQ(velocityFromLevel(50.0f), 78);
-    EXPECT_EQ(velocityFromLevel(128.0f), 103);
-    EXPECT_EQ(velocityFromLevel(255.0f), 127);
-}
-
-TEST(MidiOutputVelocity, LevelsOutsideTheScaleStayWithinOneTo127) {
-    EXPECT_EQ(velocityFromLevel(-40.0f), 24);
-    EXPECT_EQ(velocityFromLevel(std::numeric_limits<float>::quiet_NaN()), 24);
-    EXPECT_EQ(velocityFromLevel(1.0e6f), 127);
-    EXPECT_EQ(velocityFromLevel(std::numeric_limits<float>::infinity()), 127);
+TEST(MidiOutputVelocity, LevelsGiveTheVelocitiesOfTheirCurveWithinOneTo127) {
+    const float nan = std::numeric_limits<float>::quiet_NaN(), inf = std::numeric_limits<float>::infinity();
+    const std::pair<float, int> cases[] = {{0.0f, 24},  {1.0f, 24},    {50.0f, 78},   {128.0f, 103}, {255.0f, 127},
+                                           {-40.0f, 24}, {nan, 24},    {1.0e6f, 127}, {inf, 127}};
+    for (auto [level, velocity] : cases) EXPECT_EQ(velocityFromLevel(level), velocity) << level;
 }
 
 // ---- plain notes ----
@@ -259,42 +242,31 @@ TEST_F(MidiOutputPlain, ANoteIsOnAtItsStartAndOffAtItsEndWithItsAverageLevel) {
     EXPECT_EQ(file.tracks[1].endTick, 1025u);
 }
 
-TEST_F(MidiOutputPlain, ANoteOnItsKeyWritesNoBendUnlessTheTrackWasLeftBent) {
+TEST_F(MidiOutputPlain, ANoteOnItsKeyWritesNoBendUnlessTheTrackWasLeftBentAndBendsAndKeysAreLimited) {
     makeSong(640, 1.0 / 64);
     addNote(0.5, 1.0, 440.0);
     addNote(1.5, 2.0, 450.0);    // 38.9 cents sharp of A
     addNote(2.5, 3.0, 440.0);
     addNote(3.5, 4.0, 440.0);
-    ReadMidiFile file = writeAndRead(0);
-    std::vector<ReadMidiEvent> bends = eventsOfKind(file.tracks[1], 0xE0);
-    ASSERT_EQ(bends.size(), 2u);
-    EXPECT_EQ(bends[0].tick, 768u);
-    EXPECT_EQ(bends[0].data1 | bends[0].data2 << 7, 8192 + 1556);
-    EXPECT_EQ(bends[1].tick, 1280u) << "the next note on its key bends back";
-    EXPECT_EQ(bends[1].data1 | bends[1].data2 << 7, 8192);
-}
-
-TEST_F(MidiOutputPlain, BendsBeyondTheirRangeAreLimited) {
-    makeSong(640, 1.0 / 64);
-    addNote(0.5, 1.0, 440.0);
-    noteList.notes[0].pitch = 600.0f;   // five semitones above its key
-    addNote(1.5, 2.0, 440.0);
-    noteList.notes[1].pitch = 300.0f;
-    ReadMidiFile file = writeAndRead(0);
-    std::vector<ReadMidiEvent> bends = eventsOfKind(file.tracks[1], 0xE0);
-    ASSERT_EQ(bends.size(), 2u);
-    EXPECT_EQ(bends[0].data1 | bends[0].data2 << 7, 16383);
-    EXPECT_EQ(bends[1].data1 | bends[1].data2 << 7, 0);
-}
-
-TEST_F(MidiOutputPlain, KeysAboveTheMidiRangeArePlayedAtTheTopKey) {
-    makeSong(640, 1.0 / 64);
-    addNote(0.5, 1.0, 440.0);
-    noteList.notes[0].midiNote = 200;
+    addNote(4.5, 5.0, 440.0);
+    noteList.notes[4].pitch = 600.0f;   // five semitones above its key
+    addNote(5.5, 6.0, 440.0);
+    noteList.notes[5].pitch = 300.0f;
+    addNote(6.5, 7.0, 440.0);
+    noteList.notes[6].midiNote = 200;
     ReadMidiFile file = writeAndRead(0);   // the reader refuses any data byte of 128 or more
+    std::vector<ReadMidiEvent> bends = eventsOfKind(file.tracks[1], 0xE0);
+    auto value = [](const ReadMidiEvent& e) { return e.data1 | e.data2 << 7; };
+    ASSERT_EQ(bends.size(), 4u) << "the top key's bend is the one the track was left with";
+    EXPECT_EQ(bends[0].tick, 768u);
+    EXPECT_EQ(value(bends[0]), 8192 + 1556);
+    EXPECT_EQ(bends[1].tick, 1280u) << "the next note on its key bends back";
+    EXPECT_EQ(value(bends[1]), 8192);
+    EXPECT_EQ(value(bends[2]), 16383);
+    EXPECT_EQ(value(bends[3]), 0);
     std::vector<ReadNote> notes = notesOf(file);
-    ASSERT_EQ(notes.size(), 1u);
-    EXPECT_EQ(notes[0].key, 127);
+    ASSERT_EQ(notes.size(), 7u);
+    EXPECT_EQ(notes[6].key, 127) << "keys above the MIDI range play at the top key";
 }
 
 // ---- the range ----
@@ -343,34 +315,23 @@ protected:
     }
 };
 
-TEST_F(MidiOutputDetail, NotesALittleUnderHalfABlockApartAreJoinedIntoOne) {
+TEST_F(MidiOutputDetail, NotesAtMostHalfABlockApartAreJoinedIntoOne) {
     steadyBlocks(440.0f);
-    addNote(0.0, 10 * D, 440.0);
-    addNote(10.4 * D, 20 * D, 440.0);
-    std::vector<ReadNote> notes = notesOf(writeAndRead(1));
-    ASSERT_EQ(notes.size(), 1u);
-    EXPECT_EQ(notes[0].key, 69);
-    EXPECT_EQ(notes[0].onTick, 0u);
-    EXPECT_EQ(notes[0].offTick, 320u);
-    EXPECT_EQ(notes[0].velocity, 103);
-}
-
-TEST_F(MidiOutputDetail, AGapOfExactlyHalfABlockStillJoins) {
-    steadyBlocks(440.0f);
-    addNote(0.0, 10 * D, 440.0);
-    addNote(10.5 * D, 20 * D, 440.0);
-    EXPECT_EQ(notesOf(writeAndRead(1)).size(), 1u);
-}
-
-TEST_F(MidiOutputDetail, AGapOfMoreThanHalfABlockKeepsTheNotesApart) {
-    steadyBlocks(440.0f);
-    addNote(0.0, 10 * D, 440.0);
-    addNote(10.6 * D, 20 * D, 440.0);
-    std::vector<ReadNote> notes = notesOf(writeAndRead(1));
-    ASSERT_EQ(notes.size(), 2u);
-    EXPECT_EQ(notes[0].offTick, 160u);
-    EXPECT_EQ(notes[1].onTick, uint32_t(10.6 * D * 512));
-    EXPECT_EQ(notes[1].offTick, 320u);
+    for (double gap : {0.4, 0.5, 0.6}) {
+        resetNoteList();
+        addNote(0.0, 10 * D, 440.0);
+        addNote((10 + gap) * D, 20 * D, 440.0);
+        std::vector<ReadNote> notes = notesOf(writeAndRead(1));
+        ASSERT_EQ(notes.size(), gap <= 0.5 ? 1u : 2u) << gap;
+        EXPECT_EQ(notes[0].key, 69);
+        EXPECT_EQ(notes[0].onTick, 0u);
+        EXPECT_EQ(notes[0].velocity, 103);
+        EXPECT_EQ(notes.back().offTick, 320u);
+        if (notes.size() == 2) {
+            EXPECT_EQ(notes[0].offTick, 160u);
+            EXPECT_EQ(notes[1].onTick, uint32_t((10 + gap) * D * 512));
+        }
+    }
 }
 
 TEST_F(MidiOutputDetail, NotesAreJoinedOnlyWhenBothSidesArePitchedAndClose) {
@@ -517,7 +478,7 @@ TEST_F(MidiOutputRun, TheWaitCursorAndStatusTextShowWhileWritingAndAreTakenBack)
                                                                  {UI_STATUS_TEXT, ""}}));
 }
 
-TEST_F(MidiOutputRun, NothingIsWrittenWhileARecordingOrAnOpeningRuns) {
+TEST_F(MidiOutputRun, NothingIsWrittenWhileARecordingOrAnOpeningRunsOrWhenTheFileCannotBeCreated) {
     makeSong(640, 1.0 / 64);
     addNote(0.5, 1.0, 440.0);
     audioActivity.recording = true;
@@ -526,14 +487,12 @@ TEST_F(MidiOutputRun, NothingIsWrittenWhileARecordingOrAnOpeningRuns) {
     EXPECT_EQ(writeNotesMidiFile(path, 1, 1, -1.0, -1.0), 0);
     EXPECT_EQ(saveMidiFile(path, 0, 0), 0);
     EXPECT_FALSE(fileExists(path));
-    EXPECT_TRUE(uiCalls().empty());
-}
-
-TEST_F(MidiOutputRun, AFileThatCannotBeCreatedGivesZeroWithoutAMessage) {
-    makeSong(640, 1.0 / 64);
-    std::string nowhere = folder.file("missing folder/Temp0001.dat");
-    EXPECT_EQ(writeNotesMidiFile(nowhere, 0, 1, -1.0, -1.0), 0);
+    audioActivity = AudioActivity{};
+    EXPECT_EQ(writeNotesMidiFile(folder.file("missing folder/Temp0001.dat"), 0, 1, -1.0, -1.0), 0);
     EXPECT_TRUE(uiCalls().empty()) << "no message, and no status text for a file never begun";
+    std::string nowhere = folder.file("missing folder/song.mid");
+    EXPECT_EQ(saveMidiFile(nowhere, 0, 0), 0);
+    EXPECT_EQ(lastMessageText(), "Cannot " + nowhere) << "saving reports it";
 }
 
 TEST_F(MidiOutputRun, AWriteThatFailsIsReportedAndLeavesNeitherFileNorStatusText) {
@@ -585,13 +544,6 @@ TEST_F(MidiOutputSave, OnlyTheSelectedRangeIsSavedWhenAskedAndLongerThanHalfABlo
     selection.timeSelectionEnd = 2.0f + 1.0f / 128;   // exactly half a block
     ASSERT_EQ(saveMidiFile(path, 0, 1), 1);
     EXPECT_EQ(notesOf(readMidiBytes(readFileBytes(path))).size(), 3u);
-}
-
-TEST_F(MidiOutputSave, AFileThatCannotBeCreatedIsReported) {
-    makeSong(640, 1.0 / 64);
-    std::string nowhere = folder.file("missing folder/song.mid");
-    EXPECT_EQ(saveMidiFile(nowhere, 0, 0), 0);
-    EXPECT_EQ(lastMessageText(), "Cannot " + nowhere);
 }
 
 // ---- round trips ----
