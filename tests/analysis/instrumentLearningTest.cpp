@@ -7,6 +7,7 @@
 #include <algorithm>
 #include <cmath>
 #include <string>
+#include <tuple>
 #include <vector>
 
 #include "analysis/instrumentFixtures.h"
@@ -78,47 +79,21 @@ static LearningRecording scaleRecording(int low, int count, uint8_t level = 200)
 
 class PitchName : public InstrumentTest {};
 
+// The first sharp or flat anywhere decides (so a lower-case b is flat); an accidental that
+// would reach another letter's semitone is ignored; the octave is the first digit up to eight,
+// nines are passed over. No letter or no digit is reported, when asked.
 TEST_F(PitchName, NamesGiveTheirMidiNotes) {
-    struct Case {
-        const char* text;
-        int note;
-    };
-    for (Case c : {Case{"A4", 69}, Case{"C4", 60}, Case{"C#4", 61}, Case{"Db4", 61}, Case{"G3", 55}, Case{"B4", 71},
-                   Case{"C0", 12}, Case{"B8", 119}, Case{"a4", 69}, Case{"e2", 40}, Case{"Eb3", 51}, Case{"F#5", 78},
-                   Case{"pitch C 4", 60}})
-        EXPECT_EQ(parsePitchName(c.text, 1), c.note) << c.text;
+    const std::pair<const char*, int> cases[] = {
+        {"A4", 69},  {"C4", 60},  {"C#4", 61},  {"Db4", 61},  {"G3", 55},   {"B4", 71},   {"C0", 12},
+        {"B8", 119}, {"a4", 69},  {"e2", 40},   {"Eb3", 51},  {"F#5", 78},  {"pitch C 4", 60},
+        {"b4", 70},  {"C4#", 61}, {"D#b4", 63}, {"Db#4", 61}, {"B#4", 71},  {"Cb4", 60},  {"E#4", 64},
+        {"Fb4", 65}, {"A94", 69}, {"C45", 60}};
+    for (auto [text, note] : cases) EXPECT_EQ(parsePitchName(text, 1), note) << text;
     EXPECT_EQ(messageCount(), 0);
-}
-
-TEST_F(PitchName, TheFirstSharpOrFlatAnywhereDecidesSoALowerCaseBIsFlat) {
-    EXPECT_EQ(parsePitchName("b4", 1), 70);     // the letter b is also the first flat
-    EXPECT_EQ(parsePitchName("B4", 1), 71);
-    EXPECT_EQ(parsePitchName("C4#", 1), 61);
-    EXPECT_EQ(parsePitchName("D#b4", 1), 63);   // the first of the two counts
-    EXPECT_EQ(parsePitchName("Db#4", 1), 61);
-}
-
-TEST_F(PitchName, AnAccidentalThatWouldReachAnotherLettersSemitoneIsIgnored) {
-    EXPECT_EQ(parsePitchName("B#4", 1), 71);
-    EXPECT_EQ(parsePitchName("Cb4", 1), 60);
-    EXPECT_EQ(parsePitchName("E#4", 1), 64);
-    EXPECT_EQ(parsePitchName("Fb4", 1), 65);
-}
-
-TEST_F(PitchName, TheOctaveIsTheFirstDigitUpToEightAndNinesArePassedOver) {
-    EXPECT_EQ(parsePitchName("A94", 1), 69);
-    EXPECT_EQ(parsePitchName("C45", 1), 60);
-    EXPECT_EQ(parsePitchName("G9", 1), 0);
-    EXPECT_EQ(lastMessageText(), "Cannot interpret pitch in 'G9'");
-}
-
-TEST_F(PitchName, NoLetterOrNoDigitIsReportedOnlyWhenAsked) {
-    EXPECT_EQ(parsePitchName("H4", 1), 0);
-    EXPECT_EQ(lastMessageText(), "Cannot interpret pitch in 'H4'");
-    EXPECT_EQ(parsePitchName("C", 1), 0);
-    EXPECT_EQ(lastMessageText(), "Cannot interpret pitch in 'C'");
-    EXPECT_EQ(parsePitchName("", 1), 0);
-    EXPECT_EQ(lastMessageText(), "Cannot interpret pitch in ''");
+    for (const char* text : {"G9", "H4", "C", ""}) {
+        EXPECT_EQ(parsePitchName(text, 1), 0);
+        EXPECT_EQ(lastMessageText(), "Cannot interpret pitch in '" + std::string(text) + "'");
+    }
     clearUiCalls();
     EXPECT_EQ(parsePitchName("H4", 0), 0);
     EXPECT_EQ(messageCount(), 0);
@@ -151,32 +126,28 @@ TEST_F(InstrumentFileName, SevenParametersDescribeADefinitionToLearn) {
     EXPECT_EQ(messageCount(), 0);
 }
 
-TEST_F(InstrumentFileName, TooFewOrTooManyParametersAreReportedWithTheFileName) {
-    InstrumentFileParameters p{};
-    EXPECT_EQ(readInstrumentFileParameters("rec/Flute_Real_Studio_440.0_C4_B4.wav", 0, &p), 0);
-    EXPECT_EQ(lastMessageText(), "There are too few instrument definition parameters in filename data in "
-                                 "'Flute_Real_Studio_440.0_C4_B4.wav'");
-    EXPECT_EQ(readInstrumentFileParameters("Flute_Real_Studio_440.0_C4_B4_0_x.wav", 0, &p), 0);
-    EXPECT_EQ(lastMessageText(), "There are too many instrument definition parameters in filename data in "
-                                 "'Flute_Real_Studio_440.0_C4_B4_0_x.wav'");
-    EXPECT_EQ(readInstrumentFileParameters("Flute_Real_Studio_440.0_C4_B4_0.wav", 1, &p), 0);
-    EXPECT_EQ(lastMessageText(), "There are too many instrument definition parameters in filename data in "
-                                 "'Flute_Real_Studio_440.0_C4_B4_0.wav'");
-}
-
-TEST_F(InstrumentFileName, PitchesAndTheMiddleAThatCannotBeReadAreReported) {
-    InstrumentFileParameters p{};
-    EXPECT_EQ(readInstrumentFileParameters("Flute_Real_Studio_440.0_H4_B4_0.wav", 0, &p), 0);
-    EXPECT_EQ(lastMessageText(), "Cannot interpret pitch in 'H4'");
-    EXPECT_EQ(readInstrumentFileParameters("Flute_Real_Studio_440.0_C4_H4_0.wav", 0, &p), 0);
-    EXPECT_EQ(lastMessageText(), "Cannot interpret pitch in 'H4'");
-    EXPECT_EQ(readInstrumentFileParameters("Flute_Real_Studio_A440_C4_B4_0.wav", 0, &p), 0);
-    EXPECT_EQ(lastMessageText(), "Cannot interpret middle A in 'A440'");
-    EXPECT_EQ(readInstrumentFileParameters("Flute_Real_Studio_0_C4_B4_0.wav", 0, &p), 0);
-    EXPECT_EQ(lastMessageText(), "Cannot interpret middle A in '0'");
-    EXPECT_EQ(readInstrumentFileParameters("Flute_Real_Studio_440_B4_C4_0.wav", 0, &p), 0);
-    EXPECT_EQ(lastMessageText(),
-              "The low pitch is above the high pitch in filename data in 'Flute_Real_Studio_440_B4_C4_0.wav'");
+TEST_F(InstrumentFileName, ParametersThatCannotBeReadAreReportedWithTheFileName) {
+    const std::string tooFew = "There are too few instrument definition parameters in filename data in '";
+    const std::string tooMany = "There are too many instrument definition parameters in filename data in '";
+    const std::tuple<const char*, int, std::string> cases[] = {
+        {"rec/Flute_Real_Studio_440.0_C4_B4.wav", 0, tooFew + "Flute_Real_Studio_440.0_C4_B4.wav'"},
+        {"Flute_Real_Studio_440.0_C4_B4_0_x.wav", 0, tooMany + "Flute_Real_Studio_440.0_C4_B4_0_x.wav'"},
+        {"Flute_Real_Studio_440.0_C4_B4_0.wav", 1, tooMany + "Flute_Real_Studio_440.0_C4_B4_0.wav'"},
+        {"Flute_Real_Studio_440.0_H4_B4_0.wav", 0, "Cannot interpret pitch in 'H4'"},
+        {"Flute_Real_Studio_440.0_C4_H4_0.wav", 0, "Cannot interpret pitch in 'H4'"},
+        {"Flute_Real_Studio_A440_C4_B4_0.wav", 0, "Cannot interpret middle A in 'A440'"},
+        {"Flute_Real_Studio_0_C4_B4_0.wav", 0, "Cannot interpret middle A in '0'"},
+        {"Flute_Real_Studio_440_B4_C4_0.wav", 0,
+         "The low pitch is above the high pitch in filename data in 'Flute_Real_Studio_440_B4_C4_0.wav'"}};
+    for (const auto& [name, replace, text] : cases) {
+        InstrumentFileParameters p{};
+        EXPECT_EQ(readInstrumentFileParameters(name, replace, &p), 0) << name;
+        EXPECT_EQ(lastMessageText(), text);
+        // Learning stops at the same message.
+        EXPECT_EQ(learnFromRecording(name, replace, scaleRecording(60, 12)), 0);
+        EXPECT_EQ(lastMessageText(), text);
+    }
+    EXPECT_TRUE(instrumentDefinitions.definitions.empty());
 }
 
 // ---- finding notes ----
@@ -281,17 +252,14 @@ TEST_F(InstrumentNoteLearning, AHarmonicNeedsThreeBlocksInARowAndEndsAtItsFirstG
     EXPECT_EQ(s.harmonics[0].endPosition, 140);      // (9 + 2) x 255 / 20 = 140.25
 }
 
-TEST_F(InstrumentNoteLearning, TheNearestNoteFollowsTheDefinitionsMiddleA) {
+TEST_F(InstrumentNoteLearning, TheNearestNoteFollowsTheMiddleAAndTheAttackTheBlockDuration) {
     LearningRecording r = emptyRecording();
     appendNote(r, 20, {{442.0, 200, 0, 20}});
     EXPECT_NEAR(learn(r, 442.0).harmonics[0].noteFrequency, 442.0, 1e-3);
     EXPECT_NEAR(learn(r, 440.0).harmonics[0].noteFrequency, 440.0, 1e-3);
-}
-
-TEST_F(InstrumentNoteLearning, AttackLengthFollowsTheBlockDuration) {
-    LearningRecording r = emptyRecording(1.0 / 128);
-    appendNote(r, 20, {{440.0, 200, 0, 20}});
-    EXPECT_EQ(learn(r).harmonics[0].onsetMeasures, 0x55);   // 0.04 s is five blocks of 1/128 s
+    LearningRecording shortBlocks = emptyRecording(1.0 / 128);
+    appendNote(shortBlocks, 20, {{440.0, 200, 0, 20}});
+    EXPECT_EQ(learn(shortBlocks).harmonics[0].onsetMeasures, 0x55);   // 0.04 s is five blocks of 1/128 s
 }
 
 TEST_F(InstrumentNoteLearning, ThirtyTwoHarmonicsEndTheNoteWithTheMessage) {
@@ -474,18 +442,6 @@ TEST_F(InstrumentLearning, ASampleNumberOfTwoIsOutOfRangeOnceTheCountMatches) {
     EXPECT_EQ(lastMessageText(), "Pitch sample number out of range in waveform 'Flute_Real_Studio_440_C4_D4_2.wav'.");
     EXPECT_EQ(learnFromRecording("Flute_Real_Studio_440_C4_D4_x.wav", 0, scaleRecording(60, 3)), 0);
     EXPECT_EQ(lastMessageText(), "Pitch sample number out of range in waveform 'Flute_Real_Studio_440_C4_D4_x.wav'.");
-    EXPECT_TRUE(instrumentDefinitions.definitions.empty());
-}
-
-TEST_F(InstrumentLearning, TheParameterMessagesStopLearning) {
-    EXPECT_EQ(learnFromRecording("Flute_Real_Studio_440.0_C4_B4.wav", 0, scaleRecording(60, 12)), 0);
-    EXPECT_EQ(lastMessageText(), "There are too few instrument definition parameters in filename data in "
-                                 "'Flute_Real_Studio_440.0_C4_B4.wav'");
-    EXPECT_EQ(learnFromRecording("Flute_Real_Studio_440.0_C4_B4_0_0.wav", 0, scaleRecording(60, 12)), 0);
-    EXPECT_EQ(lastMessageText(), "There are too many instrument definition parameters in filename data in "
-                                 "'Flute_Real_Studio_440.0_C4_B4_0_0.wav'");
-    EXPECT_EQ(learnFromRecording("Flute_Real_Studio_440.0_H4_B4_0.wav", 0, scaleRecording(60, 12)), 0);
-    EXPECT_EQ(lastMessageText(), "Cannot interpret pitch in 'H4'");
     EXPECT_TRUE(instrumentDefinitions.definitions.empty());
 }
 
