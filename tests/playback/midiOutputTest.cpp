@@ -273,7 +273,7 @@ TEST_F(MidiOutputPlain, ANoteOnItsKeyWritesNoBendUnlessTheTrackWasLeftBentAndBen
 
 using MidiOutputRange = MidiOutputTest;
 
-TEST_F(MidiOutputRange, TheRangeStartIsTickZeroAndNotesKeepTheirOwnEnds) {
+TEST_F(MidiOutputRange, TheRangeStartIsTickZeroAndNotesKeepTheirOwnEndsAndMinusOneIsTheSongsEnd) {
     makeSong(640, 1.0 / 64);
     addNote(0.5, 1.0, 440.0);    // before the range
     addNote(1.5, 2.5, 440.0);    // starts before it
@@ -288,14 +288,10 @@ TEST_F(MidiOutputRange, TheRangeStartIsTickZeroAndNotesKeepTheirOwnEnds) {
     EXPECT_EQ(notes[0].velocity, 127);
     EXPECT_EQ(notes[1].onTick, 512u);
     EXPECT_EQ(notes[1].offTick, 768u);
-}
-
-TEST_F(MidiOutputRange, AtMinusOneTheRangeIsTheWholeSong) {
-    makeSong(640, 1.0 / 64);
-    addNote(0.0, 0.5, 440.0);
+    // At -1 the range is the whole song.
     addNote(9.5, 10.0, 440.0);
-    EXPECT_EQ(notesOf(writeAndRead(0, -1.0, -1.0)).size(), 2u);
-    EXPECT_EQ(notesOf(writeAndRead(0, -1.0, 5.0)).size(), 1u);
+    EXPECT_EQ(notesOf(writeAndRead(0, -1.0, -1.0)).size(), 5u);
+    EXPECT_EQ(notesOf(writeAndRead(0, -1.0, 3.25)).size(), 3u);
     std::vector<ReadNote> late = notesOf(writeAndRead(0, 9.0, -1.0));
     ASSERT_EQ(late.size(), 1u);
     EXPECT_EQ(late[0].onTick, 256u);
@@ -409,12 +405,16 @@ TEST_F(MidiOutputDetail, EveryBlockWritesItsVolumeWhenItChanges) {
     EXPECT_EQ(bends[0].data1 | bends[0].data2 << 7, 8192);
 }
 
-TEST_F(MidiOutputDetail, ANoteWithoutPitchedBlocksIsLeftOut) {
+TEST_F(MidiOutputDetail, ANoteWithoutPitchedBlocksOrWithoutAnFTFileIsLeftOut) {
+    addNote(0.0, 10 * D, 440.0);
+    addNote(20 * D, 30 * D, 440.0);
+    setFTBlockWindowCapacity(D);
+    EXPECT_EQ(notesOf(writeAndRead(1)).size(), 0u) << "no FT file";
+    EXPECT_EQ(messageCount(), 1) << "reported once, not for every block";
+    EXPECT_EQ(lastMessageText(), "Could not open FT file - openFTFile (2)");
     std::vector<DetailBlock> blocks(64, DetailBlock{440.0f, 128});
     for (int b = 20; b < 30; b++) blocks[b].frequency = 0.0f;
     storeDetailBlocks(blocks);
-    addNote(0.0, 10 * D, 440.0);
-    addNote(20 * D, 30 * D, 440.0);
     EXPECT_EQ(notesOf(writeAndRead(1)).size(), 1u);
     EXPECT_EQ(notesOf(writeAndRead(0)).size(), 2u) << "plain mode does not look at the blocks";
 }
@@ -450,20 +450,11 @@ TEST_F(MidiOutputDetail, AStretchLongerThanTheBlockWindowIsFollowedToItsEnd) {
     EXPECT_EQ(messageCount(), 0);
 }
 
-TEST_F(MidiOutputDetail, WithoutAnFTFileNotesAreLeftOutAndOneMessageIsShown) {
-    addNote(0.0, 10 * D, 440.0);
-    addNote(20 * D, 30 * D, 440.0);
-    setFTBlockWindowCapacity(D);
-    EXPECT_EQ(notesOf(writeAndRead(1)).size(), 0u);
-    EXPECT_EQ(messageCount(), 1) << "reported once, not for every block";
-    EXPECT_EQ(lastMessageText(), "Could not open FT file - openFTFile (2)");
-}
-
 // ---- the writer's run ----
 
 using MidiOutputRun = MidiOutputTest;
 
-TEST_F(MidiOutputRun, TheWaitCursorAndStatusTextShowWhileWritingAndAreTakenBack) {
+TEST_F(MidiOutputRun, TheWaitCursorAndStatusTextShowWhileWritingAndAreTakenBackAfterAFailureToo) {
     makeSong(640, 1.0 / 64);
     addNote(0.5, 1.0, 440.0);
     ASSERT_EQ(writeNotesMidiFile(path, 0, 1, -1.0, -1.0), 1);
@@ -476,6 +467,15 @@ TEST_F(MidiOutputRun, TheWaitCursorAndStatusTextShowWhileWritingAndAreTakenBack)
                                                                  {UI_STATUS_TEXT, "Generating MIDI..."},
                                                                  {UI_WAIT_CURSOR, "off"},
                                                                  {UI_STATUS_TEXT, ""}}));
+    // A write that fails is reported and leaves neither the file nor the status text.
+    clearUiCalls();
+    failFileCall(FILE_OP_WRITE, 20);
+    EXPECT_EQ(writeNotesMidiFile(path, 0, 0, -1.0, -1.0), 0);
+    EXPECT_EQ(messageCount(), 1);
+    EXPECT_EQ(lastMessageText(), "Bytes were not stored properly");
+    EXPECT_FALSE(fileExists(path));
+    EXPECT_EQ(uiCalls().back().call, UI_STATUS_TEXT);
+    EXPECT_EQ(uiCalls().back().text, "");
 }
 
 TEST_F(MidiOutputRun, NothingIsWrittenWhileARecordingOrAnOpeningRunsOrWhenTheFileCannotBeCreated) {
@@ -495,36 +495,9 @@ TEST_F(MidiOutputRun, NothingIsWrittenWhileARecordingOrAnOpeningRunsOrWhenTheFil
     EXPECT_EQ(lastMessageText(), "Cannot " + nowhere) << "saving reports it";
 }
 
-TEST_F(MidiOutputRun, AWriteThatFailsIsReportedAndLeavesNeitherFileNorStatusText) {
-    makeSong(640, 1.0 / 64);
-    addNote(0.5, 1.0, 440.0);
-    failFileCall(FILE_OP_WRITE, 20);
-    EXPECT_EQ(writeNotesMidiFile(path, 0, 0, -1.0, -1.0), 0);
-    EXPECT_EQ(messageCount(), 1);
-    EXPECT_EQ(lastMessageText(), "Bytes were not stored properly");
-    EXPECT_FALSE(fileExists(path));
-    ASSERT_FALSE(uiCalls().empty());
-    EXPECT_EQ(uiCalls().back().call, UI_STATUS_TEXT);
-    EXPECT_EQ(uiCalls().back().text, "");
-}
-
 // ---- saving ----
 
 using MidiOutputSave = MidiOutputTest;
-
-TEST_F(MidiOutputSave, ADetailSaveFollowsTheBlocks) {
-    makeSong(640, 1.0 / 64);
-    addNote(0.5, 1.0, 440.0);
-    std::vector<DetailBlock> blocks(640, DetailBlock{440.0f, 128});
-    for (int b = 48; b < 64; b++) blocks[b].frequency = 450.0f;
-    storeDetailBlocks(blocks);
-    ASSERT_EQ(saveMidiFile(path, 1, 0), 1);
-    ReadMidiFile file = readMidiBytes(readFileBytes(path));
-    EXPECT_EQ(notesOf(file).size(), 1u);
-    EXPECT_EQ(eventsOfKind(file.tracks[1], 0xE0).size(), 2u);
-    ASSERT_EQ(saveMidiFile(path, 0, 0), 1);
-    EXPECT_EQ(eventsOfKind(readMidiBytes(readFileBytes(path)).tracks[1], 0xE0).size(), 0u);
-}
 
 TEST_F(MidiOutputSave, OnlyTheSelectedRangeIsSavedWhenAskedAndLongerThanHalfABlock) {
     makeSong(640, 1.0 / 64);
@@ -544,6 +517,18 @@ TEST_F(MidiOutputSave, OnlyTheSelectedRangeIsSavedWhenAskedAndLongerThanHalfABlo
     selection.timeSelectionEnd = 2.0f + 1.0f / 128;   // exactly half a block
     ASSERT_EQ(saveMidiFile(path, 0, 1), 1);
     EXPECT_EQ(notesOf(readMidiBytes(readFileBytes(path))).size(), 3u);
+    // A detail save follows the blocks.
+    resetNoteList();
+    addNote(0.5, 1.0, 440.0);
+    std::vector<DetailBlock> blocks(640, DetailBlock{440.0f, 128});
+    for (int b = 48; b < 64; b++) blocks[b].frequency = 450.0f;
+    storeDetailBlocks(blocks);
+    ASSERT_EQ(saveMidiFile(path, 1, 0), 1);
+    ReadMidiFile file = readMidiBytes(readFileBytes(path));
+    EXPECT_EQ(notesOf(file).size(), 1u);
+    EXPECT_EQ(eventsOfKind(file.tracks[1], 0xE0).size(), 2u);
+    ASSERT_EQ(saveMidiFile(path, 0, 0), 1);
+    EXPECT_EQ(eventsOfKind(readMidiBytes(readFileBytes(path)).tracks[1], 0xE0).size(), 0u) << "a plain save does not";
 }
 
 // ---- round trips ----
@@ -618,12 +603,9 @@ TEST_F(MidiOutputRoundTrip, DetailStretchesComeBackAsOneNoteEachOnTheSungKey) {
 
 using MidiOutputScale = MidiOutputTest;
 
-TEST_F(MidiOutputScale, TheScaleFileNameFollowsTheDefinitionsParameters) {
+TEST_F(MidiOutputScale, AChromaticScaleOfSeparateNotesIsWrittenAtItsTimesUnderItsParametersName) {
     EXPECT_EQ(scaleMidiFileName("Flute", 60, 71, 1.0, 128), "Flute_60_71_1.0_128.mid");
     EXPECT_EQ(scaleMidiFileName("Alto sax", 49, 80, 0.26, 90), "Alto sax_49_80_0.3_90.mid");
-}
-
-TEST_F(MidiOutputScale, AChromaticScaleOfSeparateNotesIsWrittenAtItsTimes) {
     ASSERT_EQ(writeScaleMidiFile(path, "Flute", 60, 64, 0.5, 128), 1);
     ReadMidiFile file = readMidiBytes(readFileBytes(path));
     ASSERT_EQ(file.error, "");
