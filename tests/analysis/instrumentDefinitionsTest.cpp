@@ -207,66 +207,41 @@ TEST_F(InstrumentFile, AnotherVersionIsRefusedWithTheVersionMessageAndEmptiesThe
     }
 }
 
-TEST_F(InstrumentFile, AFileCutShortAnywhereIsRefusedAsEndingEarly) {
-    Bytes file = threeSemitoneFile();
+// A damaged file is refused with its reason and leaves the table empty: cut short anywhere,
+// more than 256 definitions, a sample of more than 32 harmonics, a range upside down or beyond
+// note 127, a semitone of three samples, bytes after the last definition.
+TEST_F(InstrumentFile, ADamagedFileIsRefusedWithItsReason) {
+    const Bytes file = threeSemitoneFile();
+    std::vector<std::pair<Bytes, std::string>> cases;
     for (size_t length : {size_t(0), size_t(1), size_t(4), size_t(5), size_t(100), size_t(5 + 212),
-                          size_t(5 + 212 + 1 + 9 + 56), file.size() - 1}) {
-        EXPECT_EQ(loadBytes(Bytes(file.begin(), file.begin() + long(length))), 0) << length;
-        EXPECT_EQ(lastMessageText(), damagedText("it ends before its last definition")) << length;
+                          size_t(5 + 212 + 1 + 9 + 56), file.size() - 1})
+        cases.push_back({Bytes(file.begin(), file.begin() + long(length)), "it ends before its last definition"});
+    cases.push_back({fileHead(257), "it holds more than 256 definitions"});
+    cases.push_back({fileHead(0xFFFFFFFF), "it holds more than 256 definitions"});
+    Bytes harmonics = fileHead(1);
+    putDefinitionHead(harmonics, "Flute", 60, 60);
+    harmonics.push_back(1);
+    putSample(harmonics, 0.5f, 100, 32, 0);
+    ASSERT_EQ(loadBytes(harmonics), 1) << "32 harmonics are the most a sample holds";
+    harmonics[5 + 212 + 1 + 8] = 33;
+    cases.push_back({harmonics, "a note sample has more than 32 harmonics"});
+    Bytes upsideDown = fileHead(1), beyond = fileHead(1), three = fileHead(1);
+    putDefinitionHead(upsideDown, "Flute", 61, 60);
+    putDefinitionHead(beyond, "Flute", 127, 128);
+    for (Bytes* b : {&upsideDown, &beyond}) b->insert(b->end(), {0, 0});
+    cases.push_back({upsideDown, "a semitone range has its low note above its high note"});
+    cases.push_back({beyond, "a semitone range goes beyond note 127"});
+    putDefinitionHead(three, "Flute", 60, 60);
+    three.push_back(3);
+    for (int i = 0; i < 3; i++) putSample(three, 0.5f, 100, 0, 0);
+    cases.push_back({three, "a semitone has more than two note samples"});
+    cases.push_back({file + Bytes{0}, "it has bytes after its last definition"});
+    for (const auto& [bytes, reason] : cases) {
+        EXPECT_EQ(loadBytes(bytes), 0) << reason << ", " << bytes.size() << " bytes";
+        EXPECT_EQ(lastMessageText(), damagedText(reason));
+        EXPECT_EQ(messageCount(), 1);
         EXPECT_TRUE(instrumentDefinitions.definitions.empty());
     }
-}
-
-TEST_F(InstrumentFile, ACountAbove256IsRefused) {
-    Bytes b = fileHead(257);
-    EXPECT_EQ(loadBytes(b), 0);
-    EXPECT_EQ(lastMessageText(), damagedText("it holds more than 256 definitions"));
-    EXPECT_EQ(loadBytes(fileHead(0xFFFFFFFF)), 0);
-    EXPECT_EQ(lastMessageText(), damagedText("it holds more than 256 definitions"));
-}
-
-TEST_F(InstrumentFile, ASampleWithMoreThan32HarmonicsIsRefused) {
-    Bytes b = fileHead(1);
-    putDefinitionHead(b, "Flute", 60, 60);
-    b.push_back(1);
-    putSample(b, 0.5f, 100, 32, 0);
-    ASSERT_EQ(loadBytes(b), 1);
-    b[5 + 212 + 1 + 8] = 33;
-    EXPECT_EQ(loadBytes(b), 0);
-    EXPECT_EQ(lastMessageText(), damagedText("a note sample has more than 32 harmonics"));
-    EXPECT_TRUE(instrumentDefinitions.definitions.empty());
-}
-
-TEST_F(InstrumentFile, ARangeUpsideDownOrBeyondNote127IsRefused) {
-    Bytes b = fileHead(1);
-    putDefinitionHead(b, "Flute", 61, 60);
-    b.push_back(0);
-    b.push_back(0);
-    EXPECT_EQ(loadBytes(b), 0);
-    EXPECT_EQ(lastMessageText(), damagedText("a semitone range has its low note above its high note"));
-
-    Bytes high = fileHead(1);
-    putDefinitionHead(high, "Flute", 127, 128);
-    high.push_back(0);
-    high.push_back(0);
-    EXPECT_EQ(loadBytes(high), 0);
-    EXPECT_EQ(lastMessageText(), damagedText("a semitone range goes beyond note 127"));
-}
-
-TEST_F(InstrumentFile, ASemitoneWithThreeSamplesIsRefused) {
-    Bytes b = fileHead(1);
-    putDefinitionHead(b, "Flute", 60, 60);
-    b.push_back(3);
-    for (int i = 0; i < 3; i++) putSample(b, 0.5f, 100, 0, 0);
-    EXPECT_EQ(loadBytes(b), 0);
-    EXPECT_EQ(lastMessageText(), damagedText("a semitone has more than two note samples"));
-}
-
-TEST_F(InstrumentFile, BytesAfterTheLastDefinitionAreRefused) {
-    Bytes file = threeSemitoneFile();
-    file.push_back(0);
-    EXPECT_EQ(loadBytes(file), 0);
-    EXPECT_EQ(lastMessageText(), damagedText("it has bytes after its last definition"));
 }
 
 TEST_F(InstrumentFile, AFailedAllocationGivesTheMemoryMessageAndAnEmptyTable) {
@@ -342,32 +317,24 @@ TEST_F(InstrumentFile, MutatedFilesAreRefusedOrLoadedConsistently) {
 
 // ---- saving ----
 
-TEST_F(InstrumentFile, AFailedWriteKeepsTheOldFileAndLeavesNoNewOne) {
+// A failed write or close, or a file that cannot be created, is reported and keeps the old
+// file, with no new one left behind.
+TEST_F(InstrumentFile, AFailedSaveIsReportedAndKeepsTheOldFile) {
     instrumentDefinitions.definitions.push_back(emptyDefinition("Flute", 60, 60));
     ASSERT_EQ(saveInstrumentDefinitions(), 1);
-    Bytes old = readFileBytes(definitionsPath());
+    const Bytes old = readFileBytes(definitionsPath());
     instrumentDefinitions.definitions.push_back(emptyDefinition("Oboe", 60, 70));
-    failFileCall(FILE_OP_WRITE, 2);
-    EXPECT_EQ(saveInstrumentDefinitions(), 0);
-    EXPECT_EQ(lastMessageText(), "Bytes were not stored properly");
-    EXPECT_EQ(readFileBytes(definitionsPath()), old);
-    EXPECT_FALSE(fileExists(definitionsPath() + ".new"));
-}
-
-TEST_F(InstrumentFile, AFileThatCannotBeCreatedIsReportedByItsName) {
+    for (auto [op, text] : {std::pair{FILE_OP_WRITE, "Bytes were not stored properly"},
+                            std::pair{FILE_OP_CLOSE, "File could not be closed"}}) {
+        failFileCall(op, op == FILE_OP_WRITE ? 2 : 1);
+        EXPECT_EQ(saveInstrumentDefinitions(), 0);
+        EXPECT_EQ(lastMessageText(), text);
+        EXPECT_EQ(readFileBytes(definitionsPath()), old);
+        EXPECT_FALSE(fileExists(definitionsPath() + ".new"));
+    }
     setInstrumentDefinitionsFile(folder.file("missing/CSInst.dat"));
     EXPECT_EQ(saveInstrumentDefinitions(), 0);
     EXPECT_EQ(lastMessageText(), "Cannot " + folder.file("missing/CSInst.dat"));
-}
-
-TEST_F(InstrumentFile, AFailedCloseIsReportedAndKeepsTheOldFile) {
-    ASSERT_EQ(saveInstrumentDefinitions(), 1);
-    Bytes old = readFileBytes(definitionsPath());
-    instrumentDefinitions.definitions.push_back(emptyDefinition("Flute", 60, 60));
-    failFileCall(FILE_OP_CLOSE, 1);
-    EXPECT_EQ(saveInstrumentDefinitions(), 0);
-    EXPECT_EQ(lastMessageText(), "File could not be closed");
-    EXPECT_EQ(readFileBytes(definitionsPath()), old);
 }
 
 // ---- the table ----
