@@ -13,13 +13,6 @@ static void expectColour(int level, int red, int green, int blue) {
     EXPECT_EQ(c.blue, blue) << level;
 }
 
-TEST(MeterGeometryColours, TheThresholdsAreEighthsOfFullScale) {
-    EXPECT_EQ(METER_LEVEL_A, 63);
-    EXPECT_EQ(METER_LEVEL_B, 95);
-    EXPECT_EQ(METER_LEVEL_C, 191);
-    EXPECT_EQ(METER_LEVEL_D, 223);
-}
-
 TEST(MeterGeometryColours, GoodLevelsArePureGreenAndTheEdgesShadeThroughYellowToRed) {
     expectColour(95, 0, 255, 0);
     expectColour(94, 8, 255, 0);
@@ -44,11 +37,8 @@ TEST(MeterGeometryBars, BarsFillTheAreaInsideTheMargins) {
     EXPECT_EQ(bar.left + bar.width, 408);
     EXPECT_EQ(bar.top + bar.height, 263);
     EXPECT_EQ(bar.height, 1);
-}
-
-TEST(MeterGeometryBars, ALevelOfZeroDrawsNoBar) {
-    MeterBar bar{-1, -1, -1, -1};
-    EXPECT_EQ(meterBar(5, 0, 416, 271, &bar), 0);
+    bar = MeterBar{-1, -1, -1, -1};
+    EXPECT_EQ(meterBar(5, 0, 416, 271, &bar), 0) << "a level of zero draws no bar";
     EXPECT_EQ(bar.left, -1);
 }
 
@@ -71,10 +61,7 @@ TEST(MeterGeometryHint, FourSecondsOfLowLevelWhileRecordingShowTheHint) {
     EXPECT_EQ(meterHintShown(true, 1400), 0);
     EXPECT_EQ(meterHintShown(true, 1401), 1);
     EXPECT_EQ(meterHintShown(false, 5000), 0);
-}
-
-TEST(MeterGeometryHint, OneGoodBarRemovesTheHintAtTheNextRepaint) {
-    resetMeterState(1000);
+    // One good bar removes the hint at the next repaint.
     EXPECT_EQ(meterHintShown(true, 2000), 1);
     int levels[METER_BAR_COUNT] = {};
     levels[10] = 95;
