@@ -9,24 +9,16 @@
 #include "shell/paths.h"
 #include "store/ftBlockStore.h"
 #include "store/song.h"
+#include "shell/settings.h"
 #include "store/workingFiles.h"
 #include "support/testSupport.h"
 
-class SongClose : public ::testing::Test {
+class SongClose : public SharedFolderTest {
 protected:
-    void SetUp() override {
-        savedPaths = paths;
-        setSharedBasePath(folder.path());
-        makeFolder(paths.sharedFolder);
-        clearUiCalls();
-    }
     void TearDown() override {
         closeSong();
-        paths = savedPaths;
-        clearUiCalls();
+        SharedFolderTest::TearDown();
     }
-    TempFolder folder;
-    Paths savedPaths;
 };
 
 TEST_F(SongClose, DeletesEveryWorkingFileAndEmptiesTheUndoFolder) {
@@ -39,7 +31,7 @@ TEST_F(SongClose, DeletesEveryWorkingFileAndEmptiesTheUndoFolder) {
     EXPECT_EQ(messageCount(), 0);
 }
 
-TEST_F(SongClose, LeavesNoBlocksNotesOrSelectionBehind) {
+TEST_F(SongClose, LeavesNoBlocksNotesInstrumentOrSelectionBehind) {
     song.sampleBlockDuration = 1.0 / 128;
     ASSERT_EQ(growSampleBlockDurations(10), 1);
     song.blockCount = 10;
@@ -50,8 +42,10 @@ TEST_F(SongClose, LeavesNoBlocksNotesOrSelectionBehind) {
     selection.timeSelectionStart = 0.1f;
     selection.timeSelectionEnd = 0.2f;
     setFTBlockWindowCapacity(song.sampleBlockDuration);
+    song.instrumentName = "Flute";
 
     closeSong();
+    EXPECT_EQ(songInstrumentName(), globalSettings.defaultInstrument);
     EXPECT_EQ(song.blockCount, 0u);
     EXPECT_TRUE(song.sampleBlockDurations.empty());
     EXPECT_EQ(noteList.count, 0);
