@@ -14,7 +14,7 @@
 #include "analysis/signalGenerator.h"
 #include "audio/audioActivity.h"
 #include "audio/openWaveFile.h"
-#include "audio/waveFixtures.h"
+#include "audio/openingFixtures.h"
 #include "audio/waveWorkingFile.h"
 #include "notes/noteList.h"
 #include "platform/files.h"
@@ -33,15 +33,8 @@
 
 namespace {
 
-const uint32_t RATE = 44100;
+const uint32_t RATE = OPENING_RATE;
 const uint32_t BLOCK = 512;   // samples of a block at 44,100 Hz with the default pitch range
-
-std::vector<uint8_t> melodyBytes(double seconds) {
-    MelodyGenerator generator;
-    std::vector<uint8_t> bytes(size_t(seconds * RATE) * 2);
-    generator.fill16(bytes.data(), uint32_t(bytes.size() / 2));
-    return bytes;
-}
 
 std::vector<uint8_t> toneBytes(double frequency, double seconds, int bits = 16, uint32_t rate = RATE) {
     return toSampleBytes(toneSignal(frequency, bits == 16 ? 8000.0 : 60.0, seconds, rate, {1.0, 0.5, 0.25}), bits);
@@ -72,50 +65,7 @@ bool processingMutexFree() {
     return true;
 }
 
-class OpenWaveTest : public SharedFolderTest {
-protected:
-    void SetUp() override {
-        SharedFolderTest::SetUp();
-        clean();
-    }
-    void TearDown() override {
-        clean();
-        setFreeDiskSpaceOverride(NO_FREE_SPACE_OVERRIDE);
-        SharedFolderTest::TearDown();
-    }
-    void clean() {
-        resetOpeningState();
-        resetMainLoop();
-        setFrameWindowFunctions(nullptr);
-        resetFrameState();
-        releaseFrequencyAnalysis();
-        closeSong();
-        resetSongNames();
-        resetSettings();
-        resetRecognitionOptions();
-        clearFileFailures();
-        setFreeDiskSpaceOverride(int64_t(1) << 40);
-        audioActivity = AudioActivity{};
-        openingState.quickPreferences = nullptr;
-        clearUiCalls();
-    }
-    std::string writeWave(const std::string& name, const std::vector<uint8_t>& file) {
-        std::string path = folder.file(name);
-        writeFileBytes(path, file);
-        return path;
-    }
-    std::string writeMono(const std::string& name, const std::vector<uint8_t>& samples, int bits = 16,
-                          uint32_t rate = RATE) {
-        return writeWave(name, pcmWave(1, rate, uint16_t(bits), samples));
-    }
-    // Opens path and waits for the worker to end, serving the main loop as the program does.
-    void openAndWait(const std::string& path) {
-        ASSERT_EQ(openWaveFile(path), 1);
-        ASSERT_TRUE(audioActivity.opening) << lastMessageText();
-        waitForOpeningToEnd();
-        ASSERT_FALSE(audioActivity.opening);
-    }
-};
+using OpenWaveTest = OpeningTest;
 
 // ---- refusals ----
 
