@@ -33,7 +33,7 @@ protected:
 
 }  // namespace
 
-TEST_F(AppTimersRegistry, ClaimsTakeIdsFromOneUpwardsAndReleasesCloseTheGap) {
+TEST_F(AppTimersRegistry, ClaimsTakeIdsFromOneUpwardsReleasesCloseTheGapAndAnEqualClaimReplaces) {
     ASSERT_EQ(claimEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 1, recordA), 1);
     ASSERT_EQ(claimEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 2, recordA), 1);
     ASSERT_EQ(claimEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 3, recordA), 1);
@@ -43,14 +43,10 @@ TEST_F(AppTimersRegistry, ClaimsTakeIdsFromOneUpwardsAndReleasesCloseTheGap) {
     EXPECT_EQ(appTimers.events[1].key, 3);
     EXPECT_EQ(releaseEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 2, recordA), 0);
     EXPECT_EQ(releaseEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 3, recordB), 0);
-}
-
-TEST_F(AppTimersRegistry, ClaimingAnEqualEntryReplacesItWithANewId) {
-    claimEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 7, recordA);
-    claimEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 8, recordA);
-    ASSERT_EQ(claimEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 7, recordA), 1);
-    EXPECT_EQ(ids(), std::vector<int>({2, 3}));
-    EXPECT_EQ(appTimers.events[1].key, 7);
+    // Claiming an equal entry replaces it with a new id.
+    ASSERT_EQ(claimEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 1, recordA), 1);
+    EXPECT_EQ(ids(), std::vector<int>({3, 4}));
+    EXPECT_EQ(appTimers.events[1].key, 1);
 }
 
 TEST_F(AppTimersRegistry, The129thClaimIsRefusedWithTheMessage) {

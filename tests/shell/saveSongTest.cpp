@@ -60,16 +60,6 @@ protected:
 
 }  // namespace
 
-TEST_F(CommandTableSave, TheOutputTypeFollowsThePlaybackAndNoteModes) {
-    EXPECT_EQ(currentOutputType(), OUTPUT_WAVE);
-    displayModes.noteMode = NOTE_MODE_NOTE;
-    EXPECT_EQ(currentOutputType(), OUTPUT_WAVE);
-    displayModes.playbackMode = PLAYBACK_MODE_MIDI;
-    EXPECT_EQ(currentOutputType(), OUTPUT_MIDI);
-    displayModes.noteMode = NOTE_MODE_DETAIL;
-    EXPECT_EQ(currentOutputType(), OUTPUT_DETAIL_MIDI);
-}
-
 TEST_F(CommandTableSave, ANewSongIsNamedAfterItsFileWithoutTheExtension) {
     setSongNamesFromFile("/songs/take 1.wav");
     EXPECT_EQ(songNames.remembered[OUTPUT_WAVE], "/songs/take 1");
@@ -83,6 +73,14 @@ TEST_F(CommandTableSave, ANewSongIsNamedAfterItsFileWithoutTheExtension) {
 }
 
 TEST_F(CommandTableSave, TheDialogOffersTheOutputsFilterAndProposesItsName) {
+    displayModes.noteMode = NOTE_MODE_NOTE;
+    EXPECT_EQ(currentOutputType(), OUTPUT_WAVE);
+    displayModes.playbackMode = PLAYBACK_MODE_MIDI;
+    EXPECT_EQ(currentOutputType(), OUTPUT_MIDI);
+    displayModes.noteMode = NOTE_MODE_DETAIL;
+    EXPECT_EQ(currentOutputType(), OUTPUT_DETAIL_MIDI);
+    displayModes.playbackMode = PLAYBACK_MODE_WAVE;
+    EXPECT_EQ(currentOutputType(), OUTPUT_WAVE);
     setSongNamesFromFile("/songs/take.wav");
     globalSettings.saveDirectory = "/exports";
     SaveDialogSetup wave = saveDialogSetup();
@@ -98,13 +96,10 @@ TEST_F(CommandTableSave, TheDialogOffersTheOutputsFilterAndProposesItsName) {
     EXPECT_EQ(midi.proposedName, "/songs/take detail");
 }
 
-TEST_F(CommandTableSave, SaveWithoutANameSavedBeforeNeedsTheDialog) {
-    EXPECT_EQ(saveSong(), SAVE_NEEDS_DIALOG);
+TEST_F(CommandTableSave, SaveAsWritesTheWholeSongAndSaveThenRewritesTheSameFileWithoutADialogUntilTheSongCloses) {
+    EXPECT_EQ(saveSong(), SAVE_NEEDS_DIALOG) << "no name saved before";
     setSongNamesFromFile("/songs/take.wav");
     EXPECT_EQ(saveSong(), SAVE_NEEDS_DIALOG);
-}
-
-TEST_F(CommandTableSave, SaveAsWritesTheWholeSongAndSaveThenRewritesTheSameFileWithoutADialog) {
     std::string out = folder.file("take.wav");
     ASSERT_EQ(writeSongOutput(out, false), 1);
     EXPECT_EQ(dataBytesOf(out), 8192);
@@ -114,6 +109,10 @@ TEST_F(CommandTableSave, SaveAsWritesTheWholeSongAndSaveThenRewritesTheSameFileW
     EXPECT_EQ(saveSong(), SAVE_WRITTEN);
     EXPECT_EQ(dataBytesOf(out), 8192);
     EXPECT_EQ(messageCount(), 0);
+    songWindowClosed();   // closing the song forgets its names
+    EXPECT_EQ(songNames.remembered[OUTPUT_WAVE], "");
+    EXPECT_EQ(songNames.lastSaved[OUTPUT_WAVE], "");
+    EXPECT_EQ(saveSong(), SAVE_NEEDS_DIALOG);
 }
 
 TEST_F(CommandTableSave, OnlyTheSelectedRangeIsWrittenWhenTheBoxIsCheckedAndTheRangeLongEnough) {
@@ -164,23 +163,10 @@ TEST_F(CommandTableSave, MidiOutputGoesToTheMidiWriterAndIsReportedWhenThereIsNo
     EXPECT_EQ(saveSong(), SAVE_WRITTEN);
     ASSERT_EQ(writeSongOutput(out, true), 1);
     EXPECT_EQ(midiWrites, std::vector<std::string>({out + " 1 0", out + " 1 0", out + " 1 1"}));
-}
-
-TEST_F(CommandTableSave, TheProgramSavesMidiThroughTheMidiWriter) {
-    displayModes.playbackMode = PLAYBACK_MODE_MIDI;
+    // The program's own MIDI writer.
     commandOperations.writeNotesMidiFile = saveMidiFile;
-    std::string out = folder.file("take.mid");
     ASSERT_EQ(writeSongOutput(out, false), 1);
     std::vector<uint8_t> bytes = readFileBytes(out);
     ASSERT_GE(bytes.size(), 14u);
     EXPECT_EQ(std::string(bytes.begin(), bytes.begin() + 4), "MThd");
-}
-
-TEST_F(CommandTableSave, ClosingTheSongForgetsItsNames) {
-    std::string out = folder.file("take.wav");
-    ASSERT_EQ(writeSongOutput(out, false), 1);
-    songWindowClosed();
-    EXPECT_EQ(songNames.remembered[OUTPUT_WAVE], "");
-    EXPECT_EQ(songNames.lastSaved[OUTPUT_WAVE], "");
-    EXPECT_EQ(saveSong(), SAVE_NEEDS_DIALOG);
 }
