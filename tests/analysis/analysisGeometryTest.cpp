@@ -109,20 +109,14 @@ TEST_F(AnalysisGeometrySetup, BoostSpeedLengthensTheBlocksAndNeedsFewerLevels) {
     EXPECT_EQ(g.levels, 5);
 }
 
-TEST_F(AnalysisGeometrySetup, EightBitSongsHaveAScaledNoiseFloor) {
-    EXPECT_EQ(geometryFor(PITCH_RANGE_LOW_TO_MID, false, false, 44100, 8).noiseFloor, 1887.0);
-}
-
-TEST_F(AnalysisGeometrySetup, SlowRatesGetTheirOwnBlocksAndAnAnalysedRangeCutAtHalfTheRate) {
+TEST_F(AnalysisGeometrySetup, SlowRatesAndEightBitSongsAndADamagedRangeSettingGetTheirOwnGeometry) {
+    EXPECT_EQ(geometryFor(PITCH_RANGE_LOW_TO_MID, false, false, 44100, 8).noiseFloor, 1887.0) << "a scaled noise floor";
     AnalysisGeometry g = geometryFor(PITCH_RANGE_MID_TO_HIGH, false, false, 8000);
     EXPECT_EQ(g.blockSamples, 32u) << "trunc(8000 / 128) + 1 = 63";
     EXPECT_DOUBLE_EQ(g.highestAnalysed, 4000.0);
     EXPECT_EQ(magnitudeSpectrogram.binsPerRow, 512u);
     EXPECT_EQ(magnitudeSpectrogram.hop, 64u);
-}
-
-TEST_F(AnalysisGeometrySetup, ADamagedPitchRangeSettingIsTakenAsTheDefaultRange) {
-    AnalysisGeometry g = geometryFor(7, false, false);
+    g = geometryFor(7, false, false);   // a damaged pitch range setting is the default range
     EXPECT_EQ(g.blockSamples, 512u);
     EXPECT_FLOAT_EQ(recognitionOptions.lowestFrequency, 41.3f);
 }
@@ -153,16 +147,14 @@ TEST_F(AnalysisGeometrySetup, DisablingWaveEditingDropsThePhasesAndCombinesOnlyU
     EXPECT_FALSE(frequencyAnalysis.levelPhases.empty());
 }
 
-TEST_F(AnalysisGeometrySetup, ASongWithoutAUsableFormatIsNotSetUp) {
+TEST_F(AnalysisGeometrySetup, ASongWithoutAUsableFormatOrMemoryIsNotSetUp) {
     setSongFormat(0, 16);
     EXPECT_EQ(setupFrequencyAnalysis(), 0);
     setSongFormat(44100, 24);
     EXPECT_EQ(setupFrequencyAnalysis(), 0);
     EXPECT_EQ(analysisBuffersReady(), 0);
     EXPECT_EQ(createFrequencyTable(0), -1);
-}
-
-TEST_F(AnalysisGeometrySetup, WorkingBuffersThatCannotBeHadAreAllReleasedAfterTheMemoryMessage) {
+    // Working buffers that cannot be had are all released after the memory message.
     setSongFormat(44100, 16);
     failAllocation(5);
     EXPECT_EQ(setupFrequencyAnalysis(), 0);
@@ -188,7 +180,7 @@ TEST(AnalysisGeometry, ChunksGrowWithTheBufferInWholeGroupsAndStayWithinTheWindo
     EXPECT_EQ(chunkBlockCount(g, 44100 * 600), 2560u) << "at most the window, in whole groups";
 }
 
-TEST(AnalysisGeometry, LevelsStopAtNineWithTheirMessage) {
+TEST(AnalysisGeometry, LevelsStopAtNineWithTheirMessageAndARangeNeedsAPitchGrid) {
     RecognitionOptions options;
     options.blockDuration = 1.0f / 128;
     options.lowestFrequency = 10.0f;
@@ -203,11 +195,8 @@ TEST(AnalysisGeometry, LevelsStopAtNineWithTheirMessage) {
     ASSERT_EQ(deriveAnalysisGeometry(44100, 16, options, 0, &g, &capped), 1);
     EXPECT_EQ(g.levels, 6);
     EXPECT_FALSE(capped);
-}
-
-TEST(AnalysisGeometry, ARangeWithoutAPitchGridIsRefused) {
-    RecognitionOptions options;
-    AnalysisGeometry g{};
+    // A range without a pitch grid is refused and the geometry left untouched.
+    g = AnalysisGeometry{};
     options.lowestFrequency = 0.0f;
     EXPECT_EQ(deriveAnalysisGeometry(44100, 16, options, 0, &g), 0);
     options.lowestFrequency = 500.0f;
