@@ -218,6 +218,7 @@ TEST_F(NoteListBarlines, ABarlineStaysInTheSongAndTwoBlocksFromItsNeighbours) {
         {{12.0f}, 0, 10.0},
         {{1.0f, 1.01f}, 1, 1.0 + 2 * D},
         {{1.995f, 2.0f}, 0, 2.0 - 2 * D},
+        {{1.995f, float(2.0 + 0.75 * D)}, 0, 2.0 - D},   // two blocks before the next is 2.0 - 1.25 D
         // Two blocks after 1.0 + 0.75 D is 1.0 + 2.75 D; the nearest boundary is 1.0 + 3 D.
         {{float(1.0 + 0.75 * D), 1.0f}, 1, 1.0 + 3 * D},
         {{1.0f, float(1.0 + 2.3 * D), 3.0f}, 1, float(1.0 + 2.3 * D)},   // not snapped when not moved
