@@ -3,9 +3,9 @@
 // song, and the writers of CS.fw outside those workers, are refused while either runs.
 
 struct AudioActivity {
-    bool recording;   // set by the recorder while capture runs
-    bool opening;     // set by the opening path until the worker has finished
-    double openingSeconds;   // while opening: the song's length once the whole file is read (0: unknown)
+    bool recording = false;         // set by the recorder while capture runs
+    bool opening = false;           // set by the opening path until the worker has finished
+    double openingSeconds = 0.0;    // while opening: the song's length once the whole file is read (0: unknown)
 };
 extern AudioActivity audioActivity;
 

@@ -226,14 +226,9 @@ TEST_F(MidiOutputPlain, ANoteIsOnAtItsStartAndOffAtItsEndWithItsAverageLevel) {
     int unmatched = 0;
     std::vector<ReadNote> notes = notesOf(file, &unmatched);
     EXPECT_EQ(unmatched, 0);
+    EXPECT_EQ(ticksOf(notes), (std::vector<NoteTicks>{{69, 256, 512}, {60, 640, 1024}}));
     ASSERT_EQ(notes.size(), 2u);
-    EXPECT_EQ(notes[0].key, 69);
-    EXPECT_EQ(notes[0].onTick, 256u);
-    EXPECT_EQ(notes[0].offTick, 512u);
     EXPECT_EQ(notes[0].velocity, 103);
-    EXPECT_EQ(notes[1].key, 60);
-    EXPECT_EQ(notes[1].onTick, 640u);
-    EXPECT_EQ(notes[1].offTick, 1024u);
     EXPECT_EQ(notes[1].velocity, 78);
     // Note-offs carry velocity 0; the track ends one tick after its last event.
     std::vector<ReadMidiEvent> offs = eventsOfKind(file.tracks[1], 0x80);
@@ -281,13 +276,9 @@ TEST_F(MidiOutputRange, TheRangeStartIsTickZeroAndNotesKeepTheirOwnEndsAndMinusO
     addNote(4.0, 4.5, 440.0);    // after it
     ReadMidiFile file = writeAndRead(0, 2.0, 3.25);
     std::vector<ReadNote> notes = notesOf(file);
-    ASSERT_EQ(notes.size(), 2u);
-    EXPECT_EQ(notes[0].onTick, 0u);
-    EXPECT_EQ(notes[0].offTick, 256u);
+    EXPECT_EQ(ticksOf(notes), (std::vector<NoteTicks>{{69, 0, 256}, {69, 512, 768}}));
     // The whole note's level sum over the 32 blocks written: 256 a block.
-    EXPECT_EQ(notes[0].velocity, 127);
-    EXPECT_EQ(notes[1].onTick, 512u);
-    EXPECT_EQ(notes[1].offTick, 768u);
+    EXPECT_EQ(notes.at(0).velocity, 127);
     // At -1 the range is the whole song.
     addNote(9.5, 10.0, 440.0);
     EXPECT_EQ(notesOf(writeAndRead(0, -1.0, -1.0)).size(), 5u);
@@ -318,15 +309,10 @@ TEST_F(MidiOutputDetail, NotesAtMostHalfABlockApartAreJoinedIntoOne) {
         addNote(0.0, 10 * D, 440.0);
         addNote((10 + gap) * D, 20 * D, 440.0);
         std::vector<ReadNote> notes = notesOf(writeAndRead(1));
-        ASSERT_EQ(notes.size(), gap <= 0.5 ? 1u : 2u) << gap;
-        EXPECT_EQ(notes[0].key, 69);
-        EXPECT_EQ(notes[0].onTick, 0u);
-        EXPECT_EQ(notes[0].velocity, 103);
-        EXPECT_EQ(notes.back().offTick, 320u);
-        if (notes.size() == 2) {
-            EXPECT_EQ(notes[0].offTick, 160u);
-            EXPECT_EQ(notes[1].onTick, uint32_t((10 + gap) * D * 512));
-        }
+        std::vector<NoteTicks> expected{{69, 0, 320}};
+        if (gap > 0.5) expected = {{69, 0, 160}, {69, uint32_t((10 + gap) * D * 512), 320}};
+        EXPECT_EQ(ticksOf(notes), expected) << gap;
+        EXPECT_EQ(notes.at(0).velocity, 103);
     }
 }
 
@@ -341,18 +327,8 @@ TEST_F(MidiOutputDetail, NotesAreJoinedOnlyWhenBothSidesArePitchedAndClose) {
     addNote(20 * D, 30 * D, 440.0);   // 1.6 further: a new note
     addNote(30 * D, 40 * D, 440.0);   // 3 down: a new note
     addNote(40 * D, 50 * D, 440.0);   // its predecessor's last block has no pitch: a new note
-    std::vector<ReadNote> notes = notesOf(writeAndRead(1));
-    ASSERT_EQ(notes.size(), 4u);
-    EXPECT_EQ(notes[0].key, 69);
-    EXPECT_EQ(notes[0].onTick, 0u);
-    EXPECT_EQ(notes[0].offTick, 320u);
-    EXPECT_EQ(notes[1].key, 72);
-    EXPECT_EQ(notes[1].onTick, 320u);
-    EXPECT_EQ(notes[1].offTick, 480u);
-    EXPECT_EQ(notes[2].onTick, 480u);
-    EXPECT_EQ(notes[2].offTick, 640u);
-    EXPECT_EQ(notes[3].onTick, 640u);
-    EXPECT_EQ(notes[3].offTick, 800u);
+    EXPECT_EQ(ticksOf(notesOf(writeAndRead(1))),
+              (std::vector<NoteTicks>{{69, 0, 320}, {72, 320, 480}, {69, 480, 640}, {69, 640, 800}}));
 }
 
 TEST_F(MidiOutputDetail, AGlideBeyondTheBendRangeIsRekeyedWhereTheBendWouldLeaveIt) {
@@ -365,15 +341,9 @@ TEST_F(MidiOutputDetail, AGlideBeyondTheBendRangeIsRekeyedWhereTheBendWouldLeave
     int unmatched = 0;
     std::vector<ReadNote> notes = notesOf(file, &unmatched);
     EXPECT_EQ(unmatched, 0);
-    ASSERT_EQ(notes.size(), 2u);
-    // Key 62 holds blocks 0 .. 16 within two semitones, further than 60 or 61 would.
-    EXPECT_EQ(notes[0].key, 62);
-    EXPECT_EQ(notes[0].onTick, 0u);
-    EXPECT_EQ(notes[0].offTick, 17u * 16);
-    // At block 17 (64.25) key 66 reaches the stretch's end.
-    EXPECT_EQ(notes[1].key, 66);
-    EXPECT_EQ(notes[1].onTick, 17u * 16);
-    EXPECT_EQ(notes[1].offTick, 512u);
+    // Key 62 holds blocks 0 .. 16 within two semitones, further than 60 or 61 would; at
+    // block 17 (64.25) key 66 reaches the stretch's end.
+    EXPECT_EQ(ticksOf(notes), (std::vector<NoteTicks>{{62, 0, 17 * 16}, {66, 17 * 16, 512}}));
 
     std::vector<ReadMidiEvent> bends = eventsOfKind(file.tracks[1], 0xE0);
     ASSERT_EQ(bends.size(), 32u) << "every block bends a little further";
@@ -394,12 +364,9 @@ TEST_F(MidiOutputDetail, EveryBlockWritesItsVolumeWhenItChanges) {
     ReadMidiFile file = writeAndRead(1);
     std::vector<ReadMidiEvent> volumes = eventsOfKind(file.tracks[1], 0xB0);
     volumes.erase(volumes.begin(), volumes.begin() + 4);   // the track's opening controllers
-    ASSERT_EQ(volumes.size(), 2u);
-    EXPECT_EQ(volumes[0].data1, 7);
-    EXPECT_EQ(volumes[0].data2, 78);
-    EXPECT_EQ(volumes[0].tick, 160u);
-    EXPECT_EQ(volumes[1].data2, 127);
-    EXPECT_EQ(volumes[1].tick, 320u);
+    std::vector<std::tuple<int, int, uint32_t>> written;   // controller, value, tick
+    for (const ReadMidiEvent& e : volumes) written.emplace_back(e.data1, e.data2, e.tick);
+    EXPECT_EQ(written, (std::vector<std::tuple<int, int, uint32_t>>{{7, 78, 160}, {7, 127, 320}}));
     std::vector<ReadMidiEvent> bends = eventsOfKind(file.tracks[1], 0xE0);
     ASSERT_EQ(bends.size(), 1u) << "a steady pitch bends once, at the start";
     EXPECT_EQ(bends[0].data1 | bends[0].data2 << 7, 8192);
@@ -440,9 +407,7 @@ TEST_F(MidiOutputDetail, AStretchLongerThanTheBlockWindowIsFollowedToItsEnd) {
     addNote(0.0, 640 * D, 440.0);
     addNote(640 * D, 1280 * D, 440.0);
     ReadMidiFile file = writeAndRead(1);
-    std::vector<ReadNote> notes = notesOf(file);
-    ASSERT_EQ(notes.size(), 1u);
-    EXPECT_EQ(notes[0].offTick, 1280u * 16);
+    EXPECT_EQ(ticksOf(notesOf(file)), (std::vector<NoteTicks>{{69, 0, 1280 * 16}}));
     std::vector<ReadMidiEvent> bends = eventsOfKind(file.tracks[1], 0xE0);
     ASSERT_EQ(bends.size(), 2u);
     EXPECT_EQ(bends[1].tick, 1200u * 16);
@@ -620,9 +585,7 @@ TEST_F(MidiOutputScale, AChromaticScaleOfSeparateNotesIsWrittenAtItsTimesUnderIt
     std::vector<ReadNote> notes = notesOf(file);
     ASSERT_EQ(notes.size(), 5u);
     for (int k = 0; k < 5; k++) {
-        EXPECT_EQ(notes[k].key, 60 + k);
-        EXPECT_EQ(notes[k].velocity, 103);
-        EXPECT_EQ(notes[k].onTick, uint32_t(480 * k));
+        EXPECT_EQ(std::tuple(notes[k].key, notes[k].velocity, notes[k].onTick), std::tuple(60 + k, 103, 480u * k));
         EXPECT_NEAR(notes[k].onSeconds, 1.0 * k, 1e-9);
         EXPECT_NEAR(notes[k].offSeconds, 1.0 * k + 0.5, 1e-9);
     }
