@@ -9,6 +9,7 @@
 #include <cstdint>
 #include <cstring>
 #include <string>
+#include <tuple>
 #include <vector>
 
 #include "analysis/instrumentDefinitions.h"
@@ -134,23 +135,14 @@ TEST_F(InstrumentFile, ALoadedDefinitionHoldsTheFieldsOfTheFile) {
     ASSERT_EQ(loadBytes(b), 1);
     const std::vector<InstrumentDefinition>& t = instrumentDefinitions.definitions;
     ASSERT_EQ(t.size(), 2u);
-    EXPECT_EQ(t[0].name, "Voice");
-    EXPECT_EQ(t[0].kind, "Real");
-    EXPECT_EQ(t[0].source, "Studio");
-    EXPECT_EQ(t[0].midiVoice, 53);
-    EXPECT_EQ(t[0].middleA, 442.0f);
-    EXPECT_EQ(t[0].scoreThresholds[1], 30.0f);
-    ASSERT_EQ(t[0].semitones.size(), 1u);
-    EXPECT_EQ(t[0].semitones[0].sampleCount, 1);
-    EXPECT_EQ(t[0].semitones[0].samples[0].duration, 0.25f);
-    EXPECT_EQ(t[0].semitones[0].samples[0].level, 7u);
-    EXPECT_EQ(t[1].maxNotesInChord, 12);
-    ASSERT_EQ(t[1].semitones.size(), 2u);
-    EXPECT_EQ(t[1].semitones[0].sampleCount, 0);
-    EXPECT_EQ(t[1].semitones[1].sampleCount, 2);
-    EXPECT_EQ(t[1].semitones[1].samples[0].harmonicCount, 0);
-    EXPECT_EQ(t[1].semitones[1].samples[1].level, 200u);
-    ASSERT_EQ(t[1].semitones[1].samples[1].harmonicCount, 1);
+    EXPECT_EQ(std::tuple(t[0].name, t[0].kind, t[0].source, t[0].midiVoice, t[0].middleA, t[0].scoreThresholds[1]),
+              std::tuple("Voice", "Real", "Studio", 53, 442.0f, 30.0f));
+    ASSERT_EQ(std::tuple(t[0].semitones.size(), t[1].semitones.size()), std::tuple(1u, 2u));
+    const NoteSampleSet &voice = t[0].semitones[0], &piano0 = t[1].semitones[0], &piano1 = t[1].semitones[1];
+    EXPECT_EQ(std::tuple(voice.sampleCount, voice.samples[0].duration, voice.samples[0].level), std::tuple(1, 0.25f, 7u));
+    EXPECT_EQ(std::tuple(t[1].maxNotesInChord, piano0.sampleCount, piano1.sampleCount), std::tuple(12, 0, 2));
+    EXPECT_EQ(std::tuple(piano1.samples[0].harmonicCount, piano1.samples[1].level), std::tuple(0, 200u));
+    ASSERT_EQ(piano1.samples[1].harmonicCount, 1);
     const uint8_t* h = reinterpret_cast<const uint8_t*>(&t[1].semitones[1].samples[1].harmonics[0]);
     for (int i = 0; i < 56; i++) EXPECT_EQ(h[i], uint8_t(5 + i * 13)) << i;
 }
@@ -305,12 +297,10 @@ TEST_F(InstrumentTable, DeletingMovesTheLaterDefinitionsDownAndSavesTheFile) {
 TEST_F(InstrumentTable, TheCurrentIndexMovesDownWhenItPointedAtOrPastTheNewEnd) {
     fillTable(3);
     instrumentDefinitions.current = 2;
-    EXPECT_EQ(deleteInstrumentDefinition(0), 1);
-    EXPECT_EQ(instrumentDefinitions.current, 1);
-    EXPECT_EQ(deleteInstrumentDefinition(1), 1);
-    EXPECT_EQ(instrumentDefinitions.current, 0);
-    EXPECT_EQ(deleteInstrumentDefinition(0), 1);
-    EXPECT_EQ(instrumentDefinitions.current, 0);
+    for (auto [index, current] : {std::pair(0, 1), std::pair(1, 0), std::pair(0, 0)}) {
+        EXPECT_EQ(deleteInstrumentDefinition(index), 1);
+        EXPECT_EQ(instrumentDefinitions.current, current) << index;
+    }
     EXPECT_TRUE(instrumentDefinitions.definitions.empty());
 }
 
@@ -348,12 +338,10 @@ TEST_F(InstrumentChordLimit, AValueAboveTheProgramsLimitIsReportedAndLimited) {
 class InstrumentNotes : public InstrumentTest {};
 
 TEST_F(InstrumentNotes, TheNearestNoteIsOneOfThe128NotesOfTheDefinitionsMiddleA) {
-    EXPECT_FLOAT_EQ(nearestNoteFrequency(440.0, 440.0), 440.0f);
-    EXPECT_FLOAT_EQ(nearestNoteFrequency(452.0, 440.0), 440.0f);
-    EXPECT_FLOAT_EQ(nearestNoteFrequency(455.0, 440.0), 466.16376f);
-    EXPECT_FLOAT_EQ(nearestNoteFrequency(442.0, 442.0), 442.0f);
-    EXPECT_FLOAT_EQ(nearestNoteFrequency(1.0, 440.0), 8.175799f);       // below the lowest note
-    EXPECT_FLOAT_EQ(nearestNoteFrequency(20000.0, 440.0), 12543.854f);  // above the highest
+    // (frequency, middle A, nearest note); the last two lie below the lowest note and above the highest.
+    const std::tuple<double, double, float> cases[] = {{440.0, 440.0, 440.0f}, {452.0, 440.0, 440.0f}, {455.0, 440.0, 466.16376f},
+                                                       {442.0, 442.0, 442.0f}, {1.0, 440.0, 8.175799f}, {20000.0, 440.0, 12543.854f}};
+    for (auto [f, middleA, nearest] : cases) EXPECT_FLOAT_EQ(nearestNoteFrequency(f, middleA), nearest) << f;
 }
 
 TEST_F(InstrumentNotes, TheWindowLineShowsEveryFieldInItsFormat) {

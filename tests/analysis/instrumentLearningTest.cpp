@@ -112,17 +112,10 @@ TEST_F(InstrumentFileName, TheExtensionGoesButADecimalPointStays) {
 TEST_F(InstrumentFileName, SevenParametersDescribeADefinitionToLearn) {
     InstrumentFileParameters p{};
     ASSERT_EQ(readInstrumentFileParameters("rec/Alto Sax_Real_Studio_442.5_Db3_Ab5_1.wav", 0, &p), 1);
-    EXPECT_EQ(p.name, "Alto Sax");
-    EXPECT_EQ(p.kind, "Real");
-    EXPECT_EQ(p.source, "Studio");
-    EXPECT_EQ(p.middleA, 442.5f);
-    EXPECT_EQ(p.lowSemitone, 49);
-    EXPECT_EQ(p.highSemitone, 80);
-    EXPECT_EQ(p.sampleNumber, 1);
+    EXPECT_EQ(std::tuple(p.name, p.kind, p.source, p.middleA, p.lowSemitone, p.highSemitone, p.sampleNumber),
+              std::tuple("Alto Sax", "Real", "Studio", 442.5f, 49, 80, 1));
     ASSERT_EQ(readInstrumentFileParameters("Flute_Real_Studio_440_E4_0.wav", 1, &p), 1);
-    EXPECT_EQ(p.lowSemitone, 64);
-    EXPECT_EQ(p.highSemitone, 64);
-    EXPECT_EQ(p.sampleNumber, 0);
+    EXPECT_EQ(std::tuple(p.lowSemitone, p.highSemitone, p.sampleNumber), std::tuple(64, 64, 0));
     EXPECT_EQ(messageCount(), 0);
 }
 
@@ -162,10 +155,7 @@ TEST_F(InstrumentNotesFound, ANoteMustBeLouderThan64AndLastAtLeast80Milliseconds
     appendNote(r, 9, {{440, 40, 0, 9}, {880, 25, 0, 9}}, 0);   // the block sums count: 65
     std::vector<LearningNote> notes = findLearningNotes(r);
     ASSERT_EQ(notes.size(), 2u);
-    EXPECT_EQ(notes[0].start, 0u);
-    EXPECT_EQ(notes[0].end, 6u);
-    EXPECT_EQ(notes[1].start, 16u + 15u + 19u);
-    EXPECT_EQ(notes[1].end, 59u);
+    EXPECT_EQ(std::tuple(notes[0].start, notes[0].end, notes[1].start, notes[1].end), std::tuple(0u, 6u, 16u + 15u + 19u, 59u));
 }
 
 TEST_F(InstrumentNotesFound, AtMost128NotesAreFound) {
@@ -195,24 +185,17 @@ TEST_F(InstrumentNoteLearning, EachSteadyFrequencyBecomesAHarmonicWithItsPositio
     const Harmonic& a = s.harmonics[0];
     EXPECT_NEAR(a.frequency, 220.0, 1e-3);
     EXPECT_NEAR(a.noteFrequency, 220.0, 1e-3);
-    EXPECT_EQ(a.meanAmplitude, 200u);
-    EXPECT_EQ(a.startPosition, 0);
-    EXPECT_EQ(a.endPosition, 255);   // (19 + 2) x 255 / 20, capped
-    EXPECT_EQ(a.toleranceMeasures[0], 0x0F);   // no spread above, a steady amplitude
-    EXPECT_EQ(a.toleranceMeasures[1], 0x00);
-    EXPECT_EQ(a.onsetMeasures, 0x25);          // two blocks of attack at 1/64 s
-    EXPECT_EQ(a.peakAmplitude, 200u);
-    EXPECT_EQ(a.presentBlocks, 20);
-    EXPECT_EQ(a.noteBlocks, 20);
-    EXPECT_EQ(a.onsetShape, 256);
-    EXPECT_EQ(a.decayShape, 256);
+    // It ends at (19 + 2) x 255 / 20, capped; its tolerance has no spread above and a steady
+    // amplitude; its onset is two blocks of attack at 1/64 s.
+    EXPECT_EQ(std::tuple(a.meanAmplitude, a.startPosition, a.endPosition, a.toleranceMeasures[0], a.toleranceMeasures[1]),
+              std::tuple(200u, 0, 255, 0x0F, 0x00));
+    EXPECT_EQ(std::tuple(a.onsetMeasures, a.peakAmplitude, a.presentBlocks, a.noteBlocks, a.onsetShape, a.decayShape),
+              std::tuple(0x25, 200u, 20, 20, 256, 256));
     const Harmonic& b = s.harmonics[1];
     EXPECT_NEAR(b.frequency, 440.0, 1e-3);
-    EXPECT_EQ(b.meanAmplitude, 75u);   // 100 x 15 blocks / 20
-    EXPECT_EQ(b.startPosition, 64);    // 5 x 255 / 20 = 63.75
-    EXPECT_EQ(b.endPosition, 255);
-    EXPECT_EQ(b.onsetShape, 128);      // half the strongest harmonic's mean
-    EXPECT_EQ(b.presentBlocks, 15);
+    // Mean 100 x 15 blocks / 20; start 5 x 255 / 20 = 63.75; onset half the strongest harmonic's mean.
+    EXPECT_EQ(std::tuple(b.meanAmplitude, b.startPosition, b.endPosition, b.onsetShape, b.presentBlocks),
+              std::tuple(75u, 64, 255, 128, 15));
 }
 
 TEST_F(InstrumentNoteLearning, TheStrongestHarmonicsOnsetBecomesTheNotesStart) {
@@ -221,15 +204,14 @@ TEST_F(InstrumentNoteLearning, TheStrongestHarmonicsOnsetBecomesTheNotesStart) {
     NoteSample s = learn(r);
     ASSERT_EQ(s.harmonicCount, 3);
     // Strongest: 220 Hz from block 4, position 51; the others are moved by it and stretched.
-    EXPECT_NEAR(s.harmonics[0].frequency, 220.0, 1e-3);
-    EXPECT_EQ(s.harmonics[0].startPosition, 0);
-    EXPECT_EQ(s.harmonics[0].endPosition, 255);
-    EXPECT_NEAR(s.harmonics[1].frequency, 660.0, 1e-3);
-    EXPECT_EQ(s.harmonics[1].startPosition, 0);   // before the strongest one's onset
-    EXPECT_EQ(s.harmonics[1].endPosition, 255);
-    EXPECT_NEAR(s.harmonics[2].frequency, 440.0, 1e-3);
-    EXPECT_EQ(s.harmonics[2].startPosition, 63);  // 102 -> (102 - 51) x 255 / 204
-    EXPECT_EQ(s.harmonics[2].endPosition, 175);   // 191 -> (191 - 51) x 255 / 204
+    // 660 Hz starts before the strongest one's onset; 440 Hz spans 102 .. 191, which become
+    // (102 - 51) x 255 / 204 and (191 - 51) x 255 / 204.
+    const int expected[3][3] = {{220, 0, 255}, {660, 0, 255}, {440, 63, 175}};
+    for (int k = 0; k < 3; k++) {
+        const Harmonic& h = s.harmonics[k];
+        EXPECT_NEAR(h.frequency, expected[k][0], 1e-3) << k;
+        EXPECT_EQ(std::tuple(h.startPosition, h.endPosition), std::tuple(expected[k][1], expected[k][2])) << k;
+    }
 }
 
 TEST_F(InstrumentNoteLearning, HarmonicsAreSortedByLengthTimesMeanAmplitude) {
@@ -394,10 +376,7 @@ TEST_F(InstrumentLearning, ScalesBuiltInCodeAreLearntWithTheVoiceOfTheName) {
     ASSERT_EQ(learnFromRecording("Guitar_Real_Studio_440_E2_G2_0.wav", 0, scaleRecording(40, 4)), 1);
     const std::vector<InstrumentDefinition>& t = instrumentDefinitions.definitions;
     ASSERT_EQ(t.size(), 2u);
-    EXPECT_EQ(t[0].midiVoice, 65);
-    EXPECT_EQ(t[0].maxNotesInChord, 1);
-    EXPECT_EQ(t[1].midiVoice, 24);
-    EXPECT_EQ(t[1].maxNotesInChord, 6);
+    EXPECT_EQ(std::tuple(t[0].midiVoice, t[0].maxNotesInChord, t[1].midiVoice, t[1].maxNotesInChord), std::tuple(65, 1, 24, 6));
     EXPECT_EQ(instrumentDefinitions.current, 1);
     EXPECT_NEAR(t[1].semitones[3].samples[0].harmonics[0].frequency, pitchToFrequency(43), 1e-3);
 }

@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <filesystem>
+#include <tuple>
 
 #include "audio/waveFile.h"
 #include "audio/waveFixtures.h"
@@ -48,18 +49,11 @@ TEST_F(WaveFileOpen, PcmWithoutFactCountsFramesFromTheDataBytes) {
     ASSERT_EQ(open(pcmWave(2, 22050, 16, std::vector<uint8_t>(400, 1))), WIO_OPENED);
     ASSERT_NE(info.format, nullptr);
     EXPECT_NE(info.file, nullptr);
-    EXPECT_EQ(info.format->formatTag, 1);
-    EXPECT_EQ(info.format->channels, 2);
-    EXPECT_EQ(info.format->samplesPerSec, 22050u);
-    EXPECT_EQ(info.format->avgBytesPerSec, 88200u);
-    EXPECT_EQ(info.format->blockAlign, 4);
-    EXPECT_EQ(info.format->bitsPerSample, 16);
-    EXPECT_EQ(info.format->extraSize, 0);   // read from the 18 bytes held, not beyond a 16-byte chunk
-    EXPECT_EQ(info.dataOffset, 44u);
-    EXPECT_EQ(info.dataSizeOffset, 40u);
-    EXPECT_EQ(info.dataBytes, 400u);
-    EXPECT_EQ(info.dataSamples, 100u);
-    EXPECT_EQ(info.factValueOffset, WAVE_UNKNOWN);
+    const auto& f = *info.format;   // extraSize is read from the 18 bytes held, not beyond a 16-byte chunk
+    EXPECT_EQ(std::tuple(f.formatTag, f.channels, f.samplesPerSec, f.avgBytesPerSec, f.blockAlign, f.bitsPerSample, f.extraSize),
+              std::tuple(1, 2, 22050u, 88200u, 4, 16, 0));
+    EXPECT_EQ(std::tuple(info.dataOffset, info.dataSizeOffset, info.dataBytes, info.dataSamples, info.factValueOffset),
+              std::tuple(44u, 40u, 400u, 100u, WAVE_UNKNOWN));
     EXPECT_EQ(messageCount(), 0);
     EXPECT_EQ(wioFileClose(&info), 0u);
     EXPECT_EQ(info.file, nullptr);
@@ -96,11 +90,9 @@ TEST_F(WaveFileOpen, TheDataChunkAndTheFrameCountAreFoundAsTheFileHoldsThem) {
     };
     for (const Case& c : cases) {
         ASSERT_EQ(open(c.bytes), WIO_OPENED) << c.what;
-        EXPECT_EQ(info.dataOffset, c.dataOffset) << c.what;
-        EXPECT_EQ(info.dataSizeOffset, c.dataOffset - 4) << c.what;
-        EXPECT_EQ(info.dataBytes, c.dataBytes) << c.what;
-        EXPECT_EQ(info.dataSamples, c.dataSamples) << c.what;
-        EXPECT_EQ(info.factValueOffset, c.factValueOffset) << c.what;
+        EXPECT_EQ(std::tuple(info.dataOffset, info.dataSizeOffset, info.dataBytes, info.dataSamples, info.factValueOffset),
+                  std::tuple(c.dataOffset, c.dataOffset - 4, c.dataBytes, c.dataSamples, c.factValueOffset))
+            << c.what;
         wioFileClose(&info);
     }
     EXPECT_EQ(messageCount(), 0);

@@ -6,6 +6,7 @@
 #include <cstring>
 #include <limits>
 #include <vector>
+#include <tuple>
 
 #include "notes/noteList.h"
 #include "notes/noteFixtures.h"
@@ -41,14 +42,11 @@ TEST(NoteListLayout, EveryFieldSitsInItsSlotOfTheSeventyTwoByteRecord) {
     for (auto [offset, value] : floats) EXPECT_EQ(f32At(offset), value) << offset;
     EXPECT_EQ(bytes[36], 69);
     EXPECT_EQ(bytes[37] | bytes[38] | bytes[39], 0) << "midiNote's slot is padded with zeros";
-    EXPECT_EQ(u32At(40), 0x11223344u);
-    EXPECT_EQ(u32At(48), 0x55667788u);
-    EXPECT_EQ(u32At(52), 0xFFFFFFFFu) << "instrument -1";
-    EXPECT_EQ(u32At(56), 9u);
+    // Instrument -1 at 52.
+    EXPECT_EQ(std::tuple(u32At(40), u32At(48), u32At(52), u32At(56)), std::tuple(0x11223344u, 0x55667788u, 0xFFFFFFFFu, 9u));
     EXPECT_EQ(bytes[60], 7);
     EXPECT_EQ(bytes[61] | bytes[62] | bytes[63], 0) << "group's slot is padded with zeros";
-    EXPECT_EQ(u32At(64), 0x01020304u);
-    EXPECT_EQ(u32At(68), 0xA1B2C3D4u);
+    EXPECT_EQ(std::tuple(u32At(64), u32At(68)), std::tuple(0x01020304u, 0xA1B2C3D4u));
 }
 
 // ---- limits and order ----
@@ -78,28 +76,24 @@ TEST_F(NoteListLimits, InsertAndRemoveKeepTheOtherNotesInOrder) {
     addNote(1.0f, 1.5f);
     addNote(3.0f, 3.5f);
     ASSERT_EQ(insertNote(1, noteSpanning(2.0f, 2.5f)), 1);
-    ASSERT_EQ(noteList.count, 3);
-    EXPECT_EQ(noteList.notes[0].waveStart, 1.0f);
-    EXPECT_EQ(noteList.notes[1].waveStart, 2.0f);
-    EXPECT_EQ(noteList.notes[2].waveStart, 3.0f);
+    auto starts = [] {
+        std::vector<float> s;
+        for (int i = 0; i < noteList.count; i++) s.push_back(noteList.notes[i].waveStart);
+        return s;
+    };
+    EXPECT_EQ(starts(), (std::vector<float>{1.0f, 2.0f, 3.0f}));
     ASSERT_EQ(removeNote(0), 1);
-    ASSERT_EQ(noteList.count, 2);
-    EXPECT_EQ(noteList.notes[0].waveStart, 2.0f);
-    EXPECT_EQ(noteList.notes[1].waveStart, 3.0f);
+    EXPECT_EQ(starts(), (std::vector<float>{2.0f, 3.0f}));
 }
 
 TEST_F(NoteListLimits, IndicesOutsideTheListsAreRefused) {
     addNote(1.0f, 1.5f);
     ASSERT_EQ(appendBarline(1.0f), 1);
-    EXPECT_EQ(insertNote(2, noteSpanning(2.0f, 2.5f)), 0);
-    EXPECT_EQ(insertNote(-1, noteSpanning(0.0f, 0.5f)), 0);
-    EXPECT_EQ(removeNote(1), 0);
-    EXPECT_EQ(removeNote(-1), 0);
-    EXPECT_EQ(insertBarline(2, 2.0f), 0);
-    EXPECT_EQ(removeBarline(1), 0);
-    EXPECT_EQ(removeBarline(-1), 0);
-    EXPECT_EQ(validateNoteTimes(1, false), 0);
-    EXPECT_EQ(validateNoteTimes(-1, true), 0);
+    // Every call is refused (a braced list runs them in order).
+    EXPECT_EQ((std::vector<int>{insertNote(2, noteSpanning(2.0f, 2.5f)), insertNote(-1, noteSpanning(0.0f, 0.5f)), removeNote(1),
+                                removeNote(-1), insertBarline(2, 2.0f), removeBarline(1), removeBarline(-1),
+                                validateNoteTimes(1, false), validateNoteTimes(-1, true)}),
+              std::vector<int>(9, 0));
     validateBarlineTime(1);
     validateBarlineTime(-1);
     EXPECT_EQ(noteList.count, 1);

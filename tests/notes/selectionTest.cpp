@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <vector>
+#include <tuple>
 
 #include "notes/noteFixtures.h"
 #include "notes/selection.h"
@@ -43,13 +44,9 @@ TEST_F(SelectionMembers, ASelectedNoteIsFoundWithItsPlaceInTheSelection) {
 TEST_F(SelectionMembers, SelectingTwiceKeepsOneEntryAndIndicesOutsideTheListAreRefused) {
     select({2, 2});
     EXPECT_EQ(selection.selectedNoteCount, 1);
-    EXPECT_EQ(selectNote(6), 0);
-    EXPECT_EQ(selectNote(-1), 0);
-    EXPECT_EQ(selectBarline(4), 0);
-    EXPECT_EQ(selectBarline(1), 1);
-    EXPECT_EQ(selectBarline(1), 1);
-    EXPECT_EQ(selection.selectedNoteCount, 1);
-    EXPECT_EQ(selection.selectedBarlineCount, 1);
+    EXPECT_EQ((std::vector<int>{selectNote(6), selectNote(-1), selectBarline(4), selectBarline(1), selectBarline(1)}),
+              (std::vector<int>{0, 0, 0, 1, 1}));
+    EXPECT_EQ(std::tuple(selection.selectedNoteCount, selection.selectedBarlineCount), std::tuple(1, 1));
 }
 
 TEST_F(SelectionMembers, RangesGiveTheSmallestAndLargestIndexOrZerosWhenNothingIsSelected) {
@@ -98,12 +95,10 @@ TEST_F(SelectionMembers, ClosingTheSongClearsEverySelection) {
     selection.pointerNote = 1;
     selection.pointerBarline = 0;
     resetSelection();
-    EXPECT_EQ(selection.selectedNoteCount, 0);
-    EXPECT_EQ(selection.selectedBarlineCount, 0);
-    EXPECT_EQ(selection.timeSelectionStart, -1.0f);
-    EXPECT_EQ(selection.timeSelectionEnd, -1.0f);
-    EXPECT_EQ(selection.pointerNote, -1);
-    EXPECT_EQ(selection.pointerBarline, -1);
+    const Selection& s = selection;
+    EXPECT_EQ(std::tuple(s.selectedNoteCount, s.selectedBarlineCount, s.timeSelectionStart, s.timeSelectionEnd, s.pointerNote,
+                         s.pointerBarline),
+              std::tuple(0, 0, -1.0f, -1.0f, -1, -1));
 }
 
 // ---- the time selection and the notes ----

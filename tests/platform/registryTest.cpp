@@ -8,6 +8,7 @@
 #include <cstring>
 #include <filesystem>
 #include <thread>
+#include <tuple>
 
 #include "platform/registry.h"
 #include "platform/ui.h"
@@ -305,12 +306,10 @@ TEST_F(RegistryDamage, HandWrittenFilesWithAByteOrderMarkCommentsAndWindowsLineE
     uint32_t a = 0;
     std::string b;
     std::vector<uint8_t> c;
-    EXPECT_EQ(regQueryDword(key, "A", &a), REG_OK);
-    EXPECT_EQ(a, 0x20u);   // a repeated value: the later line wins
-    EXPECT_EQ(regQueryString(key, "B", &b), REG_OK);
-    EXPECT_EQ(b, "x y");
-    EXPECT_EQ(regQueryBinary(key, "C", &c), REG_OK);
-    EXPECT_EQ(c, (std::vector<uint8_t>{0xab, 0xcd}));
+    // A repeated value: the later line wins.
+    EXPECT_EQ((std::vector<int>{regQueryDword(key, "A", &a), regQueryString(key, "B", &b), regQueryBinary(key, "C", &c)}),
+              std::vector<int>(3, REG_OK));
+    EXPECT_EQ(std::tuple(a, b, c), std::tuple(0x20u, "x y", std::vector<uint8_t>{0xab, 0xcd}));
     // A file of exactly one mebibyte is accepted.
     std::string text = "Melodrift Settings Version 1\n[SOFTWARE\\Big]\n;";
     text += std::string(1024 * 1024 - text.size() - 1, 'x') + "\n";

@@ -5,6 +5,7 @@
 
 #include <cmath>
 #include <string>
+#include <tuple>
 
 #include "analysis/recognitionOptions.h"
 #include "audio/audioActivity.h"
@@ -61,11 +62,8 @@ struct InfoTexts {
 
 void expectInfo(const InfoTexts& expected) {
     const PointerInfo& p = pointerInfo;
-    EXPECT_EQ(p.kind, expected.kind);
-    EXPECT_EQ(p.firstTime, expected.firstTime) << expected.kind;
-    EXPECT_EQ(p.secondTime, expected.secondTime) << expected.kind;
-    EXPECT_EQ(p.pitchName, expected.pitchName) << expected.kind;
-    EXPECT_EQ(p.frequencyText, expected.frequencyText) << expected.kind;
+    EXPECT_EQ(std::tuple(p.kind, p.firstTime, p.secondTime, p.pitchName, p.frequencyText),
+              std::tuple(expected.kind, expected.firstTime, expected.secondTime, expected.pitchName, expected.frequencyText));
 }
 
 TEST(PointerInfoFormats, TimesShowMinutesAndHundredthsFrequenciesWholeHertz) {

@@ -153,9 +153,9 @@ TEST_F(GeneralMidiFile, AListThatCannotBeReadIsReportedOnceAndEveryNameGetsTheFi
             writeList(RULES_LIST);
             failFileCall(FILE_OP_READ, 1);
         }
-        EXPECT_EQ(generalMidiProgram("Flute"), 1);
-        EXPECT_EQ(generalMidiName(74), "Unknown");
-        EXPECT_EQ(generalMidiProgram("Voice"), 1);
+        EXPECT_EQ((std::vector<std::string>{std::to_string(generalMidiProgram("Flute")), generalMidiName(74),
+                                            std::to_string(generalMidiProgram("Voice"))}),
+                  (std::vector<std::string>{"1", "Unknown", "1"}));
         EXPECT_EQ(messageCount(), 1);
         EXPECT_EQ(lastMessageText(), "The General MIDI instrument list '" + listPath() +
                                          "' could not be read, so instrument names cannot be matched to General MIDI "
@@ -169,9 +169,8 @@ TEST_F(GeneralMidiFile, UnreadableLinesAreLeftOutAndTheFirstIsNamed) {
               "\n"
               "200 \"Tuba\"\n"
               "41 \"Violin\"\n");
-    EXPECT_EQ(generalMidiProgram("Violin"), 41);
-    EXPECT_EQ(generalMidiProgram("Flute"), 74);
-    EXPECT_EQ(generalMidiProgram("Tuba"), 1);
+    EXPECT_EQ((std::vector<int>{generalMidiProgram("Violin"), generalMidiProgram("Flute"), generalMidiProgram("Tuba")}),
+              (std::vector<int>{41, 74, 1}));
     EXPECT_EQ(messageCount(), 1);
     EXPECT_EQ(lastMessageText(), "Line 2 of the General MIDI instrument list '" + listPath() +
                                      "' cannot be read; it and any other unreadable lines have been ignored.");
@@ -207,16 +206,10 @@ TEST_F(GeneralMidiLine, LinesInTheFormatGiveTheirNamesAndTranspositions) {
     EXPECT_EQ(parseGeneralMidiLine("25 \"Guitar\":-12 \"Nylon (soft)\":+5", names), GENERAL_MIDI_LINE_READ);
     EXPECT_EQ(parseGeneralMidiLine("0007 \"A\"\"B\":-0", names), GENERAL_MIDI_LINE_READ);
     ASSERT_EQ(names.size(), 6u);
-    EXPECT_EQ(names[0].program, 12);
-    EXPECT_EQ(names[0].name, "Vibraphone");
-    EXPECT_EQ(names[1].name, "Piano");
-    EXPECT_EQ(names[2].transpose, -12);
-    EXPECT_EQ(names[3].name, "Nylon (soft)");
-    EXPECT_EQ(names[3].transpose, 5);
-    EXPECT_EQ(names[4].program, 7);
-    EXPECT_EQ(names[4].name, "A");
-    EXPECT_EQ(names[5].name, "B");
-    EXPECT_EQ(names[5].transpose, 0);
+    std::vector<std::tuple<int, std::string, int>> read;   // program, name, transposition
+    for (const GeneralMidiName& n : names) read.emplace_back(n.program, n.name, n.transpose);
+    EXPECT_EQ(read, (std::vector<std::tuple<int, std::string, int>>{
+                        {12, "Vibraphone", 0}, {1, "Piano", 0}, {25, "Guitar", -12}, {25, "Nylon (soft)", 5}, {7, "A", 0}, {7, "B", 0}}));
     EXPECT_EQ(parseGeneralMidiLine("", names), GENERAL_MIDI_LINE_BLANK);
     EXPECT_EQ(parseGeneralMidiLine(" \t\r", names), GENERAL_MIDI_LINE_BLANK);
     EXPECT_EQ(names.size(), 6u);

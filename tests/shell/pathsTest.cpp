@@ -5,6 +5,7 @@
 
 #include <cstdlib>
 #include <filesystem>
+#include <tuple>
 
 #include "platform/registry.h"
 #include "platform/ui.h"
@@ -80,11 +81,8 @@ TEST_F(PathsDataPath, APathThatCannotBeReadIsReportedAndTheInitialDirectoryStays
     writeRoot(machineFile(), "\"ResourcePath\"=dword:00000001\n\"TorvellanSharedPath\"=\"/var/data/\"\n");
     std::string before = readFileText(machineFile());
     ASSERT_EQ(loadDataPaths(), 1);
-    EXPECT_EQ(messageCount(), 1);
-    EXPECT_EQ(lastMessageText(), "Can't read registry");
-    EXPECT_EQ(uiCalls().back().kind, MESSAGE_ERROR);
-    EXPECT_EQ(paths.resourcePath, start);
-    EXPECT_EQ(paths.sharedBasePath, "/var/data/");
+    EXPECT_EQ(std::tuple(messageCount(), lastMessageText(), uiCalls().back().kind), std::tuple(1, "Can't read registry", MESSAGE_ERROR));
+    EXPECT_EQ(std::tuple(paths.resourcePath, paths.sharedBasePath), std::tuple(start, "/var/data/"));
     EXPECT_EQ(readFileText(machineFile()), before);
 }
 
@@ -96,9 +94,8 @@ TEST_F(PathsDataPath, TheUsersSharedPathLeavesTheMachinesValueUnreadAndUnwritten
     std::string machineBefore = readFileText(machineFile());
     std::string userBefore = readFileText(userFile());
     ASSERT_EQ(loadDataPaths(), 1);
-    EXPECT_EQ(paths.sharedBasePath, "/home/singer/shared/");
-    EXPECT_EQ(paths.sharedFolder, "/home/singer/shared/Torvellan Shared/");
-    EXPECT_EQ(paths.resourcePath, "/opt/melodrift/");
+    EXPECT_EQ(std::tuple(paths.sharedBasePath, paths.sharedFolder, paths.resourcePath),
+              std::tuple("/home/singer/shared/", "/home/singer/shared/Torvellan Shared/", "/opt/melodrift/"));
     EXPECT_EQ(messageCount(), 0);
     EXPECT_EQ(readFileText(machineFile()), machineBefore);
     EXPECT_EQ(readFileText(userFile()), userBefore);
@@ -113,11 +110,8 @@ TEST_F(PathsDataPath, TheUsersSharedPathLeavesTheMachinesValueUnreadAndUnwritten
 TEST_F(PathsDataPath, AKeyThatCannotBeCreatedIsReportedAndStopsStartUp) {
     writeFileText(folder.file("config"), "in the way");
     EXPECT_EQ(loadDataPaths(), 0);
-    EXPECT_EQ(lastMessageText(), "Can't access registry properly");
-    EXPECT_EQ(messageCount(), 1);
-    EXPECT_EQ(quitFlag, 1u);
-    EXPECT_EQ(paths.resourcePath, start);
-    EXPECT_EQ(paths.sharedBasePath, start);
+    EXPECT_EQ(std::tuple(lastMessageText(), messageCount(), quitFlag), std::tuple("Can't access registry properly", 1, 1u));
+    EXPECT_EQ(std::tuple(paths.resourcePath, paths.sharedBasePath), std::tuple(start, start));
     // Saving the user's shared folder then fails too: reported, but no quitting.
     quitFlag = 0;
     EXPECT_EQ(saveSharedPath("/home/singer/takes"), 0);

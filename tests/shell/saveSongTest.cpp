@@ -4,6 +4,7 @@
 
 #include <string>
 #include <vector>
+#include <tuple>
 
 #include "audio/waveWorkingFile.h"
 #include "frameFixtures.h"
@@ -62,10 +63,9 @@ protected:
 
 TEST_F(CommandTableSave, ANewSongIsNamedAfterItsFileWithoutTheExtension) {
     setSongNamesFromFile("/songs/take 1.wav");
-    EXPECT_EQ(songNames.remembered[OUTPUT_WAVE], "/songs/take 1");
-    EXPECT_EQ(songNames.remembered[OUTPUT_MIDI], "/songs/take 1");
-    EXPECT_EQ(songNames.remembered[OUTPUT_DETAIL_MIDI], "/songs/take 1");
-    EXPECT_EQ(songNames.lastSaved[OUTPUT_WAVE], "");
+    const SongNames& n = songNames;
+    EXPECT_EQ(std::tuple(n.remembered[OUTPUT_WAVE], n.remembered[OUTPUT_MIDI], n.remembered[OUTPUT_DETAIL_MIDI], n.lastSaved[OUTPUT_WAVE]),
+              std::tuple("/songs/take 1", "/songs/take 1", "/songs/take 1", ""));
     setSongNamesFromFile("/songs/v1.2/take.mpeg");   // the dot is five characters from the end
     EXPECT_EQ(songNames.remembered[OUTPUT_WAVE], "/songs/v1.2/take.mpeg");
     setSongNamesFromFile("/songs/take.ab");
@@ -73,27 +73,24 @@ TEST_F(CommandTableSave, ANewSongIsNamedAfterItsFileWithoutTheExtension) {
 }
 
 TEST_F(CommandTableSave, TheDialogOffersTheOutputsFilterAndProposesItsName) {
-    displayModes.noteMode = NOTE_MODE_NOTE;
-    EXPECT_EQ(currentOutputType(), OUTPUT_WAVE);
-    displayModes.playbackMode = PLAYBACK_MODE_MIDI;
-    EXPECT_EQ(currentOutputType(), OUTPUT_MIDI);
-    displayModes.noteMode = NOTE_MODE_DETAIL;
-    EXPECT_EQ(currentOutputType(), OUTPUT_DETAIL_MIDI);
-    displayModes.playbackMode = PLAYBACK_MODE_WAVE;
-    EXPECT_EQ(currentOutputType(), OUTPUT_WAVE);
+    const std::tuple<int, int, int> modes[] = {{NOTE_MODE_NOTE, PLAYBACK_MODE_WAVE, OUTPUT_WAVE},
+                                               {NOTE_MODE_NOTE, PLAYBACK_MODE_MIDI, OUTPUT_MIDI},
+                                               {NOTE_MODE_DETAIL, PLAYBACK_MODE_MIDI, OUTPUT_DETAIL_MIDI},
+                                               {NOTE_MODE_DETAIL, PLAYBACK_MODE_WAVE, OUTPUT_WAVE}};
+    for (auto [noteMode, playbackMode, output] : modes) {
+        displayModes.noteMode = noteMode;
+        displayModes.playbackMode = playbackMode;
+        EXPECT_EQ(currentOutputType(), output) << noteMode << " " << playbackMode;
+    }
     setSongNamesFromFile("/songs/take.wav");
     globalSettings.saveDirectory = "/exports";
     SaveDialogSetup wave = saveDialogSetup();
-    EXPECT_EQ(wave.filterName, "Wave audio files");
-    EXPECT_EQ(wave.pattern, "*.wav");
-    EXPECT_EQ(wave.proposedName, "/songs/take");
-    EXPECT_EQ(wave.directory, "/exports");
+    EXPECT_EQ(std::tuple(wave.filterName, wave.pattern, wave.proposedName, wave.directory),
+              std::tuple("Wave audio files", "*.wav", "/songs/take", "/exports"));
     displayModes.playbackMode = PLAYBACK_MODE_MIDI;
     songNames.remembered[OUTPUT_DETAIL_MIDI] = "/songs/take detail";
     SaveDialogSetup midi = saveDialogSetup();
-    EXPECT_EQ(midi.filterName, "MIDI files");
-    EXPECT_EQ(midi.pattern, "*.mid");
-    EXPECT_EQ(midi.proposedName, "/songs/take detail");
+    EXPECT_EQ(std::tuple(midi.filterName, midi.pattern, midi.proposedName), std::tuple("MIDI files", "*.mid", "/songs/take detail"));
 }
 
 TEST_F(CommandTableSave, SaveAsWritesTheWholeSongAndSaveThenRewritesTheSameFileWithoutADialogUntilTheSongCloses) {
@@ -102,13 +99,10 @@ TEST_F(CommandTableSave, SaveAsWritesTheWholeSongAndSaveThenRewritesTheSameFileW
     EXPECT_EQ(saveSong(), SAVE_NEEDS_DIALOG);
     std::string out = folder.file("take.wav");
     ASSERT_EQ(writeSongOutput(out, false), 1);
-    EXPECT_EQ(dataBytesOf(out), 8192);
-    EXPECT_EQ(songNames.remembered[OUTPUT_WAVE], out);
-    EXPECT_EQ(songNames.lastSaved[OUTPUT_WAVE], out);
+    EXPECT_EQ(std::tuple(dataBytesOf(out), songNames.remembered[OUTPUT_WAVE], songNames.lastSaved[OUTPUT_WAVE]), std::tuple(8192, out, out));
     ASSERT_EQ(fileDelete(out), 0);
     EXPECT_EQ(saveSong(), SAVE_WRITTEN);
-    EXPECT_EQ(dataBytesOf(out), 8192);
-    EXPECT_EQ(messageCount(), 0);
+    EXPECT_EQ(std::tuple(dataBytesOf(out), messageCount()), std::tuple(8192, 0));
     songWindowClosed();   // closing the song forgets its names
     EXPECT_EQ(songNames.remembered[OUTPUT_WAVE], "");
     EXPECT_EQ(songNames.lastSaved[OUTPUT_WAVE], "");

@@ -5,6 +5,7 @@
 
 #include <cstdlib>
 #include <filesystem>
+#include <tuple>
 
 #include "platform/registry.h"
 #include "platform/ui.h"
@@ -161,10 +162,9 @@ TEST_F(SettingsValues, RecentFilesAreReadUpToTheirLimit) {
                      "\"Recent file 1\"=\"/songs/two.mid\"\n"
                      "\"Recent file 2\"=\"/songs/not counted.wav\"\n");
     ASSERT_EQ(loadGlobalSettings(), 1);
-    EXPECT_EQ(globalSettings.recentFileCount, 2);
-    EXPECT_EQ(globalSettings.recentFiles[0], "/songs/one.wav");
-    EXPECT_EQ(globalSettings.recentFiles[1], "/songs/two.mid");
-    EXPECT_EQ(globalSettings.recentFiles[2], "");
+    const GlobalSettings& g = globalSettings;
+    EXPECT_EQ(std::tuple(g.recentFileCount, g.recentFiles[0], g.recentFiles[1], g.recentFiles[2]),
+              std::tuple(2, "/songs/one.wav", "/songs/two.mid", ""));
 
     // A damaged count neither hangs start-up nor fills the file with millions of values.
     writeMachineFile("[SOFTWARE\\Torvellan\\Melodrift\\1.0\\Global settings]\n"
@@ -263,10 +263,8 @@ TEST_F(SettingsFailures, AConfigFolderThatCannotBeCreatedStopsStartUp) {
     // A file where the folder should be: creating it fails even for root.
     writeFileText(folder.file("config"), "in the way");
     EXPECT_EQ(loadGeneralSettings(), 0);
-    EXPECT_EQ(lastMessageText(), "Can't access registry properly");
-    EXPECT_EQ(uiCalls().back().kind, MESSAGE_ERROR);
-    EXPECT_EQ(uiCalls().back().title, "Message from Torvellan Melodrift");
-    EXPECT_EQ(quitFlag, 1u);
+    EXPECT_EQ(std::tuple(lastMessageText(), uiCalls().back().kind, uiCalls().back().title, quitFlag),
+              std::tuple("Can't access registry properly", MESSAGE_ERROR, "Message from Torvellan Melodrift", 1u));
     EXPECT_TRUE(generalSettings.splashScreen);
     EXPECT_EQ(readFileText(folder.file("config")), "in the way");
 
@@ -276,17 +274,14 @@ TEST_F(SettingsFailures, AConfigFolderThatCannotBeCreatedStopsStartUp) {
     EXPECT_EQ(saveGeneralSettings(), 0);
     EXPECT_EQ(lastMessageText(), "Can't access registry properly");
     EXPECT_EQ(saveAudioGlobalSettings(), 0);
-    EXPECT_EQ(messageCount(), 2);
-    EXPECT_EQ(quitFlag, 0u);
+    EXPECT_EQ(std::tuple(messageCount(), quitFlag), std::tuple(2, 0u));
 }
 
 TEST_F(SettingsFailures, ASettingsFileThatCannotBeReadStopsStartUpWithItsErrorNumber) {
     fs::create_directories(machineFile());   // a folder where the file should be
     EXPECT_EQ(loadAudioGlobalSettings(), 0);
-    EXPECT_EQ(lastMessageText(), "Can't open registry - Err 29");
-    EXPECT_EQ(messageCount(), 1);
-    EXPECT_EQ(quitFlag, 1u);
-    EXPECT_EQ(globalSettings.playbackMode, 2);
+    EXPECT_EQ(std::tuple(lastMessageText(), messageCount(), quitFlag, globalSettings.playbackMode),
+              std::tuple("Can't open registry - Err 29", 1, 1u, 2));
 }
 
 TEST_F(SettingsFailures, ADamagedFileIsReportedKeptAsideAndTheDefaultsAreUsed) {

@@ -3,6 +3,8 @@
 // opening and closing, and every message a corrupt or hostile file gives.
 #include <gtest/gtest.h>
 
+#include <tuple>
+
 #include "store/ftBlockStoreFixtures.h"
 
 namespace {
@@ -60,8 +62,7 @@ TEST_F(FTBlockFormat, ABlockWithNoEntriesIsStoredAsTwelveZeroBytes) {
     ASSERT_EQ(openFTFile(FT_UPDATE), 1);
     TestBlock empty = makeBlock(0, 0, 0, 0);
     int ok = 0;
-    EXPECT_EQ(seek(0, 1, 1, &ok), 0);
-    EXPECT_EQ(ok, 1);
+    EXPECT_EQ(std::tuple(seek(0, 1, 1, &ok), ok), std::tuple(0, 1));
     EXPECT_EQ(writeFTBlock(ftFiles.ftFile, 0, &empty.data, &empty.orig, &empty.detected), 12u);
     EXPECT_EQ(setFTBlockSize(ftFiles.ftIndexFile, 0, 12), 1);
     ASSERT_EQ(closeFTFile(1), 1);
@@ -222,18 +223,15 @@ TEST_F(FTBlockIndex, AppendingWritesTheNewEntryWhereTheLastBlockEndsAndFlushesTh
     storeModel(blocks);
     song.blockCount = 10;
     ASSERT_EQ(openFTFile(FT_UPDATE), 1);
-    EXPECT_EQ(seek(4, 1, 1, &ok), 0) << "more than one past the count";
-    EXPECT_EQ(ok, 0);
+    EXPECT_EQ(std::tuple(seek(4, 1, 1, &ok), ok), std::tuple(0, 0)) << "more than one past the count";
     EXPECT_EQ(lastMessageText(), CANNOT_WRITE);
-    EXPECT_EQ(seek(3, 1, 1, &ok), 0);
-    EXPECT_EQ(ok, 1);
+    EXPECT_EQ(std::tuple(seek(3, 1, 1, &ok), ok), std::tuple(0, 1));
     EXPECT_EQ(fileTell(ftFiles.ftFile), int64_t(modelFiles(blocks).ft.size()));
     closeFTFile(1);
     std::vector<uint8_t> fi = readFileBytes(fiPath());
     ASSERT_EQ(fi.size(), 4u + 8 * 4);
-    EXPECT_EQ(getU32(fi, 0), 4u);
-    EXPECT_EQ(getU32(fi, 4 + 8 * 3), uint32_t(modelFiles(blocks).ft.size()));
-    EXPECT_EQ(getU32(fi, 8 + 8 * 3), 0u);
+    EXPECT_EQ(std::tuple(getU32(fi, 0), getU32(fi, 4 + 8 * 3), getU32(fi, 8 + 8 * 3)),
+              std::tuple(4u, uint32_t(modelFiles(blocks).ft.size()), 0u));
 }
 
 TEST_F(FTBlockIndex, RewritingWithTruncateDropsEveryLaterBlock) {
@@ -242,11 +240,9 @@ TEST_F(FTBlockIndex, RewritingWithTruncateDropsEveryLaterBlock) {
     storeModel(blocks);
     ASSERT_EQ(openFTFile(FT_UPDATE), 1);
     int ok = 0;
-    EXPECT_EQ(seek(2, 1, 0, &ok), int(getU32(m.fi, 8 + 16)));
-    EXPECT_EQ(ok, 1);
+    EXPECT_EQ(std::tuple(seek(2, 1, 0, &ok), ok), std::tuple(int(getU32(m.fi, 8 + 16)), 1));
     EXPECT_EQ(readFileBytes(fiPath()), m.fi) << "without truncate the index stays as it is";
-    EXPECT_EQ(seek(2, 1, 1, &ok), int(getU32(m.fi, 8 + 16)));
-    EXPECT_EQ(ok, 1);
+    EXPECT_EQ(std::tuple(seek(2, 1, 1, &ok), ok), std::tuple(int(getU32(m.fi, 8 + 16)), 1));
     EXPECT_EQ(fileTell(ftFiles.ftFile), int64_t(getU32(m.fi, 4 + 16)));
     closeFTFile(1);
     std::vector<uint8_t> expected = m.fi;
@@ -261,16 +257,13 @@ TEST_F(FTBlockIndex, TheBlockAfterTheLastIsWhereTheDataEndsAndTheOneAfterThatIsR
     storeModel(blocks);
     ASSERT_EQ(openFTFile(FT_READ), 1);
     int ok = 0;
-    EXPECT_EQ(getFTBlockIndex(ftFiles.ftIndexFile, 2, &ok), getU32(m.fi, 4 + 16));
-    EXPECT_EQ(ok, 1);
-    EXPECT_EQ(getFTBlockIndex(ftFiles.ftIndexFile, 4, &ok), uint32_t(m.ft.size()));
-    EXPECT_EQ(ok, 1);
+    auto indexOf = [&](uint32_t block) { uint32_t at = getFTBlockIndex(ftFiles.ftIndexFile, block, &ok); return std::tuple(at, ok); };
+    EXPECT_EQ(indexOf(2), std::tuple(getU32(m.fi, 4 + 16), 1));
+    EXPECT_EQ(indexOf(4), std::tuple(uint32_t(m.ft.size()), 1));
     EXPECT_EQ(messageCount(), 0);
-    EXPECT_EQ(getFTBlockIndex(ftFiles.ftIndexFile, 5, &ok), 0u);
-    EXPECT_EQ(ok, 0);
+    EXPECT_EQ(indexOf(5), std::tuple(0u, 0));
     EXPECT_EQ(lastMessageText(), INDEX_NOT_STORED);
-    EXPECT_EQ(seek(4, 0, 0, &ok), 0) << "reading a block the index does not hold";
-    EXPECT_EQ(ok, 0);
+    EXPECT_EQ(std::tuple(seek(4, 0, 0, &ok), ok), std::tuple(0, 0)) << "reading a block the index does not hold";
     EXPECT_EQ(lastMessageText(), SEEK_PAST_END);
     closeFTFile(0);
 
@@ -324,12 +317,10 @@ TEST_F(FTBlockIndex, AHostileCountIsCappedByTheEntriesTheFileHolds) {
     song.blockCount = 1000;
     ASSERT_EQ(openFTFile(FT_READ), 1);
     int ok = 0;
-    EXPECT_EQ(getFTBlockIndex(ftFiles.ftIndexFile, 2, &ok), uint32_t(m.ft.size()));
-    EXPECT_EQ(ok, 1);
+    EXPECT_EQ(std::tuple(getFTBlockIndex(ftFiles.ftIndexFile, 2, &ok), ok), std::tuple(uint32_t(m.ft.size()), 1));
     EXPECT_EQ(getFTBlockIndex(ftFiles.ftIndexFile, 3, &ok), 0u);
     EXPECT_EQ(lastMessageText(), INDEX_NOT_STORED);
-    EXPECT_EQ(seek(2, 0, 0, &ok), 0);
-    EXPECT_EQ(ok, 0);
+    EXPECT_EQ(std::tuple(seek(2, 0, 0, &ok), ok), std::tuple(0, 0));
     EXPECT_EQ(lastMessageText(), SEEK_PAST_END);
     closeFTFile(1);
 }
@@ -341,11 +332,9 @@ TEST_F(FTBlockIndex, AnEntryReachingPastTheDataFileIsSeekingPastTheEnd) {
     writeFileBytes(ftPath(), std::vector<uint8_t>(m.ft.begin(), m.ft.end() - 1));   // last block one byte short
     ASSERT_EQ(openFTFile(FT_READ), 1);
     int ok = 0;
-    EXPECT_EQ(seek(1, 0, 0, &ok), int(getU32(m.fi, 8 + 8)));
-    EXPECT_EQ(ok, 1);
+    EXPECT_EQ(std::tuple(seek(1, 0, 0, &ok), ok), std::tuple(int(getU32(m.fi, 8 + 8)), 1));
     EXPECT_EQ(messageCount(), 0);
-    EXPECT_EQ(seek(2, 0, 0, &ok), 0);
-    EXPECT_EQ(ok, 0);
+    EXPECT_EQ(std::tuple(seek(2, 0, 0, &ok), ok), std::tuple(0, 0));
     EXPECT_EQ(lastMessageText(), SEEK_PAST_END);
     closeFTFile(0);
 
@@ -374,8 +363,7 @@ TEST_F(FTBlockIndex, AnIndexTooShortForItsCountOrMissingIsRefusedByEveryReader) 
     song.blockCount = 1;
     ASSERT_EQ(openFTFile(FT_UPDATE), 1);
     int ok = 1;
-    EXPECT_EQ(getFTBlockIndex(ftFiles.ftIndexFile, 0, &ok), 0u);
-    EXPECT_EQ(ok, 0);
+    EXPECT_EQ(std::tuple(getFTBlockIndex(ftFiles.ftIndexFile, 0, &ok), ok), std::tuple(0u, 0));
     EXPECT_EQ(lastMessageText(), INDEX_NOT_STORED);
     EXPECT_EQ(seek(0, 1, 1, &ok), 0);
     EXPECT_EQ(lastMessageText(), CANNOT_WRITE);
@@ -410,11 +398,8 @@ TEST_F(FTBlockFiles, AnUpdateOpenCreatesBothFilesEmptyAndASecondOpenIsRefused) {
     EXPECT_EQ(lastMessageText(), "FT File(s) already open - openFTFile (1)");
     EXPECT_EQ(ftFiles.ftFile, open);
     EXPECT_EQ(closeFTFile(1), 1);
-    EXPECT_EQ(ftFilesOpen(), 0);
-    EXPECT_EQ(ftFiles.ftFile, nullptr);
-    EXPECT_EQ(ftFiles.ftIndexFile, nullptr);
-    EXPECT_EQ(fileSize(ftPath()), 0);
-    EXPECT_EQ(fileSize(fiPath()), 0);
+    EXPECT_EQ(std::tuple(ftFilesOpen(), ftFiles.ftFile, ftFiles.ftIndexFile), std::tuple(0, nullptr, nullptr));
+    EXPECT_EQ(std::tuple(fileSize(ftPath()), fileSize(fiPath())), std::tuple(0, 0));
     EXPECT_EQ(closeFTFile(1), 1) << "closing with nothing open does nothing";
 }
 

@@ -238,11 +238,9 @@ TEST_F(HiresFTRoundTrip, DeviationsFollowTheOffsetFromEachBinsCentre) {
     Spectrum out;
     std::vector<float> deviations(N, 9.0f);
     ASSERT_GT(readScratch(out, deviations.data()), 0u);
-    EXPECT_NEAR(deviations[0], 500.0, tolerance);
-    EXPECT_NEAR(deviations[75], 750.0, tolerance);
-    EXPECT_NEAR(deviations[150], 1000.0, tolerance);
-    EXPECT_EQ(deviations[1], 0.0f) << "a bin that is not stored has no deviation";
-    EXPECT_EQ(deviations[599], 0.0f);
+    for (auto [bin, deviation] : {std::pair(0, 500.0), std::pair(75, 750.0), std::pair(150, 1000.0)})
+        EXPECT_NEAR(deviations[bin], deviation, tolerance) << bin;
+    EXPECT_EQ(std::pair(deviations[1], deviations[599]), std::pair(0.0f, 0.0f)) << "a bin not stored has no deviation";
 
     ASSERT_GT(writeScratch(s, float(std::log(0.5))), 0u);   // an octave down
     ASSERT_GT(readScratch(out, deviations.data()), 0u);

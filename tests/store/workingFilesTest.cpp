@@ -1,6 +1,8 @@
 // Closing a song: every working file goes, and nothing of the song stays in memory.
 #include <gtest/gtest.h>
 
+#include <tuple>
+
 #include "notes/noteList.h"
 #include "notes/selection.h"
 #include "platform/files.h"
@@ -48,12 +50,9 @@ TEST_F(SongClose, LeavesNoBlocksNotesInstrumentOrSelectionBehind) {
     EXPECT_EQ(songInstrumentName(), globalSettings.defaultInstrument);
     EXPECT_EQ(song.blockCount, 0u);
     EXPECT_TRUE(song.sampleBlockDurations.empty());
-    EXPECT_EQ(noteList.count, 0);
-    EXPECT_EQ(selection.selectedNoteCount, 0);
-    EXPECT_EQ(selection.timeSelectionStart, -1.0f);
-    EXPECT_EQ(selection.timeSelectionEnd, -1.0f);
-    EXPECT_EQ(ftBlockWindow.firstBlock, 0u);
-    EXPECT_EQ(ftBlockWindow.endBlock, 0u);
+    EXPECT_EQ(std::tuple(noteList.count, selection.selectedNoteCount, selection.timeSelectionStart, selection.timeSelectionEnd),
+              std::tuple(0, 0, -1.0f, -1.0f));
+    EXPECT_EQ(std::tuple(ftBlockWindow.firstBlock, ftBlockWindow.endBlock), std::tuple(0u, 0u));
 }
 
 TEST_F(SongClose, AFileThatCannotBeDeletedIsReported) {
