@@ -102,6 +102,41 @@ int makeFolder(const std::string& path) {
 
 int renameFile(const std::string& from, const std::string& to) { return std::rename(from.c_str(), to.c_str()); }
 
+FILE* createFileBeside(const std::string& target, std::string* temporaryPath) {
+    temporaryPath->clear();
+    if (injectedFailure(FILE_OP_OPEN)) {
+        errno = EIO;
+        return nullptr;
+    }
+    size_t slash = target.rfind('/');
+    std::string folder = slash == std::string::npos ? "" : target.substr(0, slash + 1);
+    std::string name = slash == std::string::npos ? target : target.substr(slash + 1);
+    // O_EXCL makes a name that is taken fail rather than open another file, and mode 0666
+    // lets the umask decide the permissions, as for any file the user creates.
+    static std::atomic<unsigned> counter{0};
+    for (int attempt = 0; attempt < 100; attempt++) {
+        std::string path = folder + "." + name + "." + std::to_string(getpid()) + "-" +
+                           std::to_string(counter.fetch_add(1)) + ".part";
+        int fd = open(path.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0666);
+        if (fd < 0) {
+            if (errno == EEXIST) continue;
+            return nullptr;
+        }
+        FILE* f = fdopen(fd, "wb");
+        if (!f) {
+            int error = errno;
+            close(fd);
+            unlink(path.c_str());
+            errno = error;
+            return nullptr;
+        }
+        *temporaryPath = path;
+        return f;
+    }
+    errno = EEXIST;
+    return nullptr;
+}
+
 int64_t freeDiskSpace(const std::string& folder) {
     int64_t forced = freeSpaceOverride.load();
     if (forced >= 0 || forced == -1) return forced;

@@ -23,6 +23,13 @@ bool folderExists(const std::string& path);
 int makeFolder(const std::string& path);                      // 0 when it exists afterwards
 int renameFile(const std::string& from, const std::string& to);  // 0 on success
 
+// A new, empty file beside target (in its folder, under a hidden name of its own) open for
+// writing, so that an output replaces target only once it is complete: write it, close it,
+// then renameFile it over target (or fileDelete it). The name never meets an existing file,
+// and the file gets the permissions a newly created target would get. nullptr when it cannot
+// be made (errno tells why; an injected FILE_OP_OPEN failure counts); *temporaryPath then "".
+FILE* createFileBeside(const std::string& target, std::string* temporaryPath);
+
 // Failure injection for tests: the nth call of op from now fails (1 = the next call);
 // 0 switches it off. Every injection is cleared by clearFileFailures().
 enum FileOp { FILE_OP_OPEN, FILE_OP_CLOSE, FILE_OP_SEEK, FILE_OP_READ, FILE_OP_WRITE, FILE_OP_DELETE, FILE_OP_COUNT };

@@ -6,6 +6,7 @@
 #include <cassert>
 
 #include "platform/files.h"
+#include "platform/ui.h"
 #include "store/fileRoutines.h"
 
 int encodeVariableLength(uint32_t value, uint8_t* out) {
@@ -54,9 +55,9 @@ static uint8_t statusByte(uint8_t kind, int channel) { return uint8_t(kind | (ch
 
 int createMidiFile(MidiFileWriter& w, const std::string& path) {
     w = MidiFileWriter{};
-    w.file = fileOpen(path, "wb");
+    w.file = createFileBeside(path, &w.path);
     if (!w.file) return 0;
-    w.path = path;
+    w.target = path;
     w.ok = 1;
     return 1;
 }
@@ -198,6 +199,10 @@ int finishMidiFile(MidiFileWriter& w) {
         fileClose(w.file);
     }
     w.file = nullptr;
+    if (w.ok && renameFile(w.path, w.target) != 0) {
+        showMessage(MESSAGE_ERROR, "Cannot " + w.target);
+        w.ok = 0;
+    }
     // Half a MIDI file is no MIDI file: a player or a later reader would take it for one.
     if (!w.ok) fileDelete(w.path);
     return w.ok;

@@ -42,7 +42,8 @@ constexpr uint8_t MIDI_CC_REVERB = 91;
 // skipped, so a caller writes on and learns the outcome from finishMidiFile.
 struct MidiFileWriter {
     FILE* file = nullptr;                          // open for writing; nullptr when none
-    std::string path;                              // the file's path, to remove it when it failed
+    std::string target;                            // the file asked for: replaced once the file is complete
+    std::string path;                              // the file being written beside it, renamed over target
     int ok = 0;                                    // 1 while every write succeeded; a caller giving up sets 0
     uint32_t position = 0;                         // bytes written so far
     int declaredTracks = 0;                        // track count the header announced
@@ -57,8 +58,10 @@ struct MidiFileWriter {
 // count, 1 to 4. A value above MIDI_MAX_VARIABLE_LENGTH is written as that maximum.
 int encodeVariableLength(uint32_t value, uint8_t* out);
 
-// Creates path for writing ("wb"). 1 when created; 0 when not, with no message (callers word
-// it) and the writer left without a file.
+// Starts a file for path: the bytes go to a new file beside it, which replaces path only
+// when finishMidiFile has written it whole, so a failed write never leaves a damaged file
+// where path was. 1 when started; 0 when the new file cannot be made, with no message
+// (callers word it) and the writer left without a file.
 int createMidiFile(MidiFileWriter& w, const std::string& path);
 // "MThd", length 6, format, track count (at most MIDI_MAX_TRACKS), division.
 void writeMidiHeader(MidiFileWriter& w, uint16_t format, uint16_t trackCount, uint16_t division);
@@ -82,9 +85,10 @@ void writeMidiProgramChange(MidiFileWriter& w, uint32_t tick, int channel, int p
 // value 0 .. MIDI_PITCH_BEND_MAX, MIDI_PITCH_BEND_CENTRE for none; low 7 bits first.
 void writeMidiPitchBend(MidiFileWriter& w, uint32_t tick, int channel, int value);
 
-// Fills in every track's length and closes the file. 1 when the whole file was written; 0 after
-// a reported failure ("Bytes were not stored properly", "File could not be seeked", "File could
-// not be closed") or when the caller gave up, and then the incomplete file is removed.
+// Fills in every track's length, closes the file and puts it in place of the target. 1 when the
+// whole file was written; 0 after a reported failure ("Bytes were not stored properly", "File
+// could not be seeked", "File could not be closed", "Cannot " and the target when it cannot be
+// replaced) or when the caller gave up: then the new file is removed and the target is as it was.
 int finishMidiFile(MidiFileWriter& w);
 
 // UTF-8 text in Latin-1: each character above U+00FF and each byte that is not valid UTF-8

@@ -2,6 +2,7 @@
 // of allocations.
 #include <gtest/gtest.h>
 
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -108,4 +109,34 @@ TEST(AllocationFailureInjection, FailsExactlyTheNthAllocationAndLeavesTheVectorA
     EXPECT_FALSE(tryResize(v, v.max_size() + 1));
     EXPECT_FALSE(tryAllocate([] { throw std::bad_alloc(); }));
     EXPECT_EQ(v.size(), 3u);
+}
+
+TEST(FilesBeside, ANewFileBesideTheTargetNeverMeetsAnExistingOneAndTakesTheUmask) {
+    TempFolder folder;
+    std::string target = folder.file("song.mid");
+    writeFileText(target, "kept");
+    mode_t saved = umask(027);
+    std::string first, second;
+    FILE* a = createFileBeside(target, &first);
+    FILE* b = createFileBeside(target, &second);
+    umask(saved);
+    ASSERT_NE(a, nullptr);
+    ASSERT_NE(b, nullptr);
+    EXPECT_NE(first, second);
+    EXPECT_EQ(first.rfind(folder.file(".song.mid."), 0), 0u) << first;
+    struct stat info;
+    ASSERT_EQ(stat(first.c_str(), &info), 0);
+    EXPECT_EQ(info.st_mode & 0777, 0640u);
+    std::fputs("new", a);
+    std::fclose(a);
+    std::fclose(b);
+    EXPECT_EQ(readFileText(target), "kept");
+    ASSERT_EQ(renameFile(first, target), 0);
+    EXPECT_EQ(readFileText(target), "new");
+
+    failFileCall(FILE_OP_OPEN, 1);
+    std::string none = "x";
+    EXPECT_EQ(createFileBeside(target, &none), nullptr);
+    EXPECT_EQ(none, "");
+    clearFileFailures();
 }
