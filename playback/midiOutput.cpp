@@ -3,6 +3,7 @@
 // entry point; and the chromatic scale file a new instrument is learnt from.
 #include "playback/midiOutput.h"
 
+#include <algorithm>
 #include <charconv>
 #include <cmath>
 #include <vector>
@@ -112,8 +113,26 @@ static int bendValue(int bend) {
 
 static int limitKey(int key) { return key < 0 ? 0 : key > MAX_MIDI_KEY ? MAX_MIDI_KEY : key; }
 
-// Plain mode: one MIDI note per note, bent to the note's pitch when that is off its key.
-static void writePlainNotes(MidiFileWriter& w, int channel, MidiRange& range) {
+// One event of plain mode, gathered before it is written.
+struct PlainEvent {
+    uint32_t tick;
+    int kind;    // MIDI_NOTE_ON, MIDI_PITCH_BEND or MIDI_NOTE_OFF
+    int key;     // note events
+    int value;   // note-on: velocity; bend: the bend value
+};
+
+// Plain mode: one MIDI note per note, bent to the note's pitch when that is off its key. The
+// events are written in the order of their ticks: notes read from a MIDI file may overlap
+// (chords, several parts), and a note-on must not wait for the end of the note before it.
+// 1; 0 when the memory for the events could not be had (reported).
+static int writePlainNotes(MidiFileWriter& w, int channel, MidiRange& range) {
+    std::vector<PlainEvent> events;
+    try {
+        events.reserve(size_t(noteList.count) * 3);
+    } catch (const std::bad_alloc&) {
+        showMessage(MESSAGE_ERROR, resourceString(10401));
+        return 0;
+    }
     int currentBend = MIDI_PITCH_BEND_CENTRE;
     for (int i = 0; i < noteList.count; i++) {
         const Note& note = noteList.notes[i];
@@ -121,14 +140,23 @@ static void writePlainNotes(MidiFileWriter& w, int channel, MidiRange& range) {
         if (!noteTaken(note, range)) continue;
         double tOn = onTime(note, range);
         int key = limitKey(note.midiNote);
-        writeMidiNoteOn(w, tickAt(range, tOn), channel, key, noteVelocity(note, range, tOn));
+        events.push_back({tickAt(range, tOn), MIDI_NOTE_ON, key, noteVelocity(note, range, tOn)});
         int value = bendValue(rawBend(note.pitch, pitchToFrequency(key)));
         if (value != currentBend) {
-            writeMidiPitchBend(w, tickAt(range, tOn), channel, value);
+            events.push_back({tickAt(range, tOn), MIDI_PITCH_BEND, key, value});
             currentBend = value;
         }
-        writeMidiNoteOff(w, tickAt(range, note.midiEnd), channel, key);
+        events.push_back({tickAt(range, note.midiEnd), MIDI_NOTE_OFF, key, 0});
     }
+    // Stable: events of one tick keep the order of the notes (an end before the next start).
+    std::stable_sort(events.begin(), events.end(),
+                     [](const PlainEvent& a, const PlainEvent& b) { return a.tick < b.tick; });
+    for (const PlainEvent& e : events) {
+        if (e.kind == MIDI_NOTE_ON) writeMidiNoteOn(w, e.tick, channel, e.key, e.value);
+        else if (e.kind == MIDI_PITCH_BEND) writeMidiPitchBend(w, e.tick, channel, e.value);
+        else writeMidiNoteOff(w, e.tick, channel, e.key);
+    }
+    return 1;
 }
 
 // What detail mode needs of one block: its detected pitch and level.
@@ -305,6 +333,8 @@ struct GeneratingMidi {
 
 static int writeMidiFile(const std::string& path, int detail, double start, double end, int reportCreate) {
     if (recordingOrOpeningActive()) return 0;
+    // Notes read from a MIDI file have no sung pitch behind them to follow.
+    if (song.notesOnly) detail = 0;
     MidiRange range;
     range.start = start < 0.0 ? 0.0 : start;
     range.firstBlock = blockAtTime(range.start);
@@ -348,7 +378,7 @@ static int writeMidiFile(const std::string& path, int detail, double start, doub
         if (detail) {
             if (!writeDetailNotes(w, channel, range, reader)) w.ok = 0;
         } else {
-            writePlainNotes(w, channel, range);
+            if (!writePlainNotes(w, channel, range)) w.ok = 0;
         }
         if (!w.ok) break;
         endMidiTrack(w, 1);

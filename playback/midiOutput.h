@@ -43,7 +43,8 @@ void resetMidiOutput();
 int velocityFromLevel(float level);
 
 // Writes the notes from start to end (seconds; -1.0 for the song's start and end) to path,
-// plain or in detail; forPlayback (MIDI-mode playback) changes nothing in the output. 1 when
+// plain or in detail (always plain for a song of notes read from a MIDI file, which has no
+// sung pitch); forPlayback (MIDI-mode playback) changes nothing in the output. 1 when
 // written; 0 while a recording or an opening runs (nothing is created), when path cannot be
 // created (no message), or after a write failure was reported (the incomplete file removed).
 // Shows the wait cursor and "Generating MIDI..." while it writes. Detail mode moves the

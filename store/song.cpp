@@ -19,6 +19,7 @@ void resetSong() {
     song.waveFormat = SongWaveFormat{};
     song.workingWaveBytes = 0;
     song.instrumentName.clear();
+    song.notesOnly = false;
 }
 
 int growSampleBlockDurations(uint32_t blocks) {

@@ -27,6 +27,9 @@ struct Song {
     SongWaveFormat waveFormat;                  // format of CS.fw's source (set by acceptWaveFormat)
     uint32_t workingWaveBytes;                  // data bytes stored in CS.fw so far
     std::string instrumentName;                 // the song's instrument; "" until the song sets it
+    bool notesOnly;                             // the notes came from a MIDI file and there is no
+                                                // recording: the blocks are only the notes' time axis,
+                                                // with no CS.fw, FT or Hires data (set by MIDI import)
 };
 extern Song song;
 

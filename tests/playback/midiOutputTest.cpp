@@ -6,6 +6,7 @@
 
 #include <cmath>
 #include <cstring>
+#include <filesystem>
 #include <limits>
 #include <string>
 #include <vector>
@@ -429,13 +430,18 @@ TEST_F(MidiOutputRun, TheWaitCursorAndStatusTextShowWhileWritingAndAreTakenBackA
                                                                  {UI_STATUS_TEXT, "Generating MIDI..."},
                                                                  {UI_WAIT_CURSOR, "off"},
                                                                  {UI_STATUS_TEXT, ""}}));
-    // A write that fails is reported and leaves neither the file nor the status text.
+    // A write that fails is reported and leaves the file written before as it was, nothing
+    // beside it, and no status text.
     clearUiCalls();
+    Bytes before = readFileBytes(path);
     failFileCall(FILE_OP_WRITE, 20);
     EXPECT_EQ(writeNotesMidiFile(path, 0, 0, -1.0, -1.0), 0);
     EXPECT_EQ(messageCount(), 1);
     EXPECT_EQ(lastMessageText(), "Bytes were not stored properly");
-    EXPECT_FALSE(fileExists(path));
+    EXPECT_EQ(readFileBytes(path), before);
+    for (const std::filesystem::directory_entry& entry : std::filesystem::directory_iterator(folder.path())) {
+        EXPECT_EQ(entry.path().filename().string().rfind(".song.mid", 0), std::string::npos) << entry.path();
+    }
     EXPECT_EQ(uiCalls().back().call, UI_STATUS_TEXT);
     EXPECT_EQ(uiCalls().back().text, "");
 }
