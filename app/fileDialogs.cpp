@@ -24,7 +24,12 @@ QFileDialog* createOpenDialog(QWidget* parent) {
     dialog->setOption(QFileDialog::DontUseNativeDialog);
     dialog->setAcceptMode(QFileDialog::AcceptOpen);
     dialog->setFileMode(QFileDialog::ExistingFiles);
-    dialog->setNameFilters({QString("%1 (*.wav)").arg(WAVE_FILES_FILTER_NAME)});
+    QStringList filters = {QString("%1 (*.wav)").arg(WAVE_FILES_FILTER_NAME),
+                           QString("%1 (*.mid *.midi)").arg(MIDI_FILES_FILTER_NAME)};
+    dialog->setNameFilters(filters);
+    // The filter the dialog was last left with, counted from 1.
+    int stored = globalSettings.openFilter;
+    if (stored >= 1 && stored <= filters.size()) dialog->selectNameFilter(filters[stored - 1]);
     dialog->setDirectory(startFolder(globalSettings.openDirectory));
     return dialog;
 }

@@ -1,5 +1,6 @@
 #pragma once
-// The Open and Save dialogs. Open offers "Wave audio files" and takes many files; Save offers
+// The Open and Save dialogs. Open offers "Wave audio files" and "MIDI files" and takes many
+// files; Save offers
 // the one filter of the current output type, proposes the song's remembered name and carries
 // the "&Only save selected range" check box. Both start in their stored folder and filter and
 // store them back after OK.

@@ -71,7 +71,9 @@ void SongView::resizeEvent(QResizeEvent* event) {
 // Detail mode draws the blocks the FT block window holds; when the visible stretch lies
 // outside it, the window is moved there. Never while the worker fills it.
 void SongView::loadVisibleBlocks() {
-    if (displayModes.noteMode != NOTE_MODE_DETAIL || recordingOrOpeningActive() || song.blockCount == 0) return;
+    if (displayModes.noteMode != NOTE_MODE_DETAIL || recordingOrOpeningActive() || song.blockCount == 0 ||
+        song.notesOnly)
+        return;
     uint32_t from = blockAtTime(std::max(0.0, xToTime(songViewGeometry.plotLeft)));
     uint32_t to = std::min(song.blockCount, blockAtTime(std::max(0.0, xToTime(viewport()->width()))) + 1);
     if (from >= ftBlockWindow.firstBlock && to <= ftBlockWindow.endBlock) return;

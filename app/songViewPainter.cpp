@@ -183,9 +183,10 @@ void paintNoteBar(Painting& p, const QRectF& r, bool selected) {
 }
 
 // The notes as bars at midiNote (Note mode), or as a light band under the pitch curve (Detail).
+// Notes read from a MIDI file have no pitch curve: they are bars in both modes.
 void paintNotes(Painting& p) {
     bool wave = displayModes.playbackMode == PLAYBACK_MODE_WAVE;
-    bool detail = displayModes.noteMode == NOTE_MODE_DETAIL;
+    bool detail = displayModes.noteMode == NOTE_MODE_DETAIL && !song.notesOnly;
     double h = noteBarHeight();
     for (int i = 0; i < noteList.count; i++) {
         const Note& n = noteList.notes[i];

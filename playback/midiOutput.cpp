@@ -127,9 +127,7 @@ struct PlainEvent {
 // 1; 0 when the memory for the events could not be had (reported).
 static int writePlainNotes(MidiFileWriter& w, int channel, MidiRange& range) {
     std::vector<PlainEvent> events;
-    try {
-        events.reserve(size_t(noteList.count) * 3);
-    } catch (const std::bad_alloc&) {
+    if (!tryAllocate([&] { events.reserve(size_t(noteList.count) * 3); })) {
         showMessage(MESSAGE_ERROR, resourceString(10401));
         return 0;
     }

@@ -4,6 +4,8 @@
 #include "analysis/noteRecognition.h"
 #include "notes/noteList.h"
 #include "notes/selection.h"
+#include "playback/midiImport.h"
+#include "playback/midiOutput.h"
 #include "store/workingFiles.h"
 
 int closeSong() {
@@ -11,5 +13,7 @@ int closeSong() {
     resetNoteList();
     resetNoteRecognition();
     resetSelection();
+    resetMidiImport();
+    resetMidiOutput();
     return closed;
 }

@@ -2,26 +2,15 @@
 // thread: a second file started while it runs would be refused with "whilst opening".
 #include "shell/openQueue.h"
 
-#include <cctype>
-
 #include "audio/audioActivity.h"
 #include "platform/mainloop.h"
 #include "platform/ui.h"
+#include "playback/midiImport.h"
+#include "shell/closeSong.h"
 #include "shell/commandDispatch.h"
+#include "store/song.h"
 
 OpenQueue openQueue;
-
-static bool hasExtension(const std::string& path, const char* extension) {
-    std::string ext = extension;
-    if (path.size() < ext.size()) return false;
-    for (size_t i = 0; i < ext.size(); i++)
-        if (std::tolower(static_cast<unsigned char>(path[path.size() - ext.size() + i])) != ext[i]) return false;
-    return true;
-}
-
-static bool isMidiFile(const std::string& path) {
-    return hasExtension(path, ".mid") || hasExtension(path, ".midi");
-}
 
 int queueFilesToOpen(const std::vector<std::string>& paths) {
     int queued = 0;
@@ -53,7 +42,7 @@ void workOffOpenQueue() {
         }
         std::string path = openQueue.paths.front();
         openQueue.paths.pop_front();
-        if (isMidiFile(path)) {
+        if (isMidiFileName(path)) {
             if (!commandOperations.readMidiFile) {
                 // One message is enough for the whole queue.
                 openQueue.paths.clear();
@@ -66,6 +55,12 @@ void workOffOpenQueue() {
                 openQueue.paths.clear();
                 showMessage(MESSAGE_INFORMATION, notAvailableText("Opening wave files"));
                 break;
+            }
+            // A song of notes read from a MIDI file has no recording to add the wave to: the
+            // wave starts a song of its own.
+            if (song.notesOnly) {
+                closeSong();
+                resetSongNames();
             }
             commandOperations.openWaveFile(path);
         }

@@ -20,6 +20,10 @@ int currentOutputType() {
 int saveAllowed() {
     // Writing the wave file reads CS.fw, which the worker is still writing.
     if (refuseWhileBusy()) return 0;
+    if (currentOutputType() == OUTPUT_WAVE && song.notesOnly) {
+        showMessage(MESSAGE_INFORMATION, NO_RECORDING_TO_SAVE_TEXT);
+        return 0;
+    }
     if (currentOutputType() != OUTPUT_WAVE && !commandOperations.writeNotesMidiFile) {
         showMessage(MESSAGE_INFORMATION, notAvailableText("Saving MIDI files"));
         return 0;

@@ -13,9 +13,15 @@ enum OutputType { OUTPUT_WAVE = 0, OUTPUT_MIDI = 1, OUTPUT_DETAIL_MIDI = 2 };
 // The output type of the current modes.
 int currentOutputType();
 
+// Shown when a song of notes read from a MIDI file is to be saved as a wave.
+constexpr const char* NO_RECORDING_TO_SAVE_TEXT =
+    "This song holds only the notes of a MIDI file, so there is no recording to save as a wave file. "
+    "Choose MIDI mode to save the notes as a MIDI file.";
+
 // Whether a save may start: 0 after "Sorry - this cannot be done whilst recording audio." or
-// "... whilst opening audio.", or after saying that MIDI files cannot be written by this
-// build; else 1. Asked before the Save dialog, so no name is chosen in vain.
+// "... whilst opening audio.", after NO_RECORDING_TO_SAVE_TEXT (Wave mode, a song of notes
+// only), or after saying that MIDI files cannot be written by this build; else 1. Asked
+// before the Save dialog, so no name is chosen in vain.
 int saveAllowed();
 
 // Results of saveSong.
