@@ -8,9 +8,10 @@ const std::vector<CliCommand>& cliCommands() {
          "analyse a wave file and recognise its notes; write the tables, notes and pitch track as CSV", 1,
          runAnalyseCommand},
         {"open",
-         "IN.wav [--midi OUT.mid [--detail]] [--wave OUT.wav [--range START END]] [--notes-csv FILE] "
+         "IN.wav|IN.mid [--midi OUT.mid [--detail]] [--wave OUT.wav [--range START END]] [--notes-csv FILE] "
          "[--pitch-range 0|1|2] [--enhanced] [--boost]",
-         "open a wave file as the desktop program does, print its notes, save them as MIDI and the song as a wave",
+         "open a wave or MIDI file as the desktop program does, print its notes, save them as MIDI and the song "
+         "as a wave",
          1, runOpenCommand},
         {"learn-instrument", "[--replace] [--output FILE] FILE...",
          "learn instrument definitions from recordings named with their parameters", 1, runLearnInstrumentCommand},

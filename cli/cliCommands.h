@@ -21,9 +21,9 @@ int runInfoCommand(const std::vector<std::string>& arguments);
 // analyse IN.wav [options]: the whole-song analysis of IN.wav; the frequency tables, the notes
 // and the pitch track as CSV files.
 int runAnalyseCommand(const std::vector<std::string>& arguments);
-// open IN.wav [--midi OUT.mid [--detail]] [--wave OUT.wav [--range START END]] [--notes-csv FILE]
-// [--pitch-range 0|1|2] [--enhanced] [--boost]: opens IN.wav as the desktop program does,
-// prints its notes and saves them and the song.
+// open IN.wav|IN.mid [--midi OUT.mid [--detail]] [--wave OUT.wav [--range START END]] [--notes-csv FILE]
+// [--pitch-range 0|1|2] [--enhanced] [--boost]: opens a wave or MIDI file as the desktop program
+// does, prints its notes and saves them and the song.
 int runOpenCommand(const std::vector<std::string>& arguments);
 // learn-instrument [--replace] [--output FILE] FILE...: instrument definitions learnt from recordings.
 int runLearnInstrumentCommand(const std::vector<std::string>& arguments);

@@ -1,9 +1,9 @@
-// melodrift-cli open IN.wav [--midi OUT.mid [--detail]] [--wave OUT.wav [--range START END]]
+// melodrift-cli open IN.wav|IN.mid [--midi OUT.mid [--detail]] [--wave OUT.wav [--range START END]]
 // [--notes-csv FILE] [--pitch-range 0|1|2] [--enhanced] [--boost]: opens a wave file the way
 // the desktop program's Open does (the opening worker analyses it chunk by chunk while the
-// main loop runs), prints the notes it found and saves the song's notes as a MIDI file and its
-// audio as a wave file. The analysis options are preferences for this run only. `analyse`
-// hands its --midi and --wave requests here.
+// main loop runs), or reads a MIDI file's notes as Open does, prints the notes and saves them
+// as a MIDI file and the song's audio as a wave file. The analysis options are preferences
+// for this run only. `analyse` hands its --midi and --wave requests here.
 #include "cli/cliCommands.h"
 
 #include <algorithm>
@@ -17,6 +17,7 @@
 #include "notes/noteList.h"
 #include "platform/files.h"
 #include "platform/ui.h"
+#include "playback/midiImport.h"
 #include "playback/midiOutput.h"
 #include "shell/closeSong.h"
 #include "shell/settings.h"
@@ -81,11 +82,15 @@ static bool parseOpenRequest(const std::vector<std::string>& arguments, OpenRequ
         }
     }
     if (request->input.empty()) {
-        std::fprintf(stderr, "melodrift-cli: open: no wave file named\n");
+        std::fprintf(stderr, "melodrift-cli: open: no wave or MIDI file named\n");
         return false;
     }
     if (request->detail && request->midiPath.empty()) {
         std::fprintf(stderr, "melodrift-cli: --detail goes with --midi OUT.mid\n");
+        return false;
+    }
+    if (isMidiFileName(request->input) && !request->wavePath.empty()) {
+        std::fprintf(stderr, "melodrift-cli: --wave needs a recording; %s holds only notes\n", request->input.c_str());
         return false;
     }
     if (request->start >= 0 && request->wavePath.empty()) {
@@ -100,8 +105,10 @@ static std::string noteName(int midiNote) {
     return std::string(names[midiNote % 12]) + std::to_string(midiNote / 12 - 1);
 }
 
+// The table goes to a new file beside path, renamed over it once it is complete.
 static int writeNotesTable(const std::string& path) {
-    FILE* csv = fileOpen(path, "w");
+    std::string temporary;
+    FILE* csv = createFileBeside(path, &temporary);
     if (!csv) {
         showMessage(MESSAGE_ERROR, "Cannot " + path);
         return 0;
@@ -113,7 +120,8 @@ static int writeNotesTable(const std::string& path) {
                      double(n.pitch), n.volumeSum);
     }
     bool failed = std::ferror(csv) != 0;
-    if (fileClose(csv) != 0 || failed) {
+    if (fileClose(csv) != 0 || failed || renameFile(temporary, path) != 0) {
+        fileDelete(temporary);
         showMessage(MESSAGE_ERROR, "Cannot " + path);
         return 0;
     }
@@ -123,10 +131,19 @@ static int writeNotesTable(const std::string& path) {
 static void printSummary(const OpenRequest& request) {
     const OpeningState& o = openingState;
     std::printf("File: %s\n", request.input.c_str());
-    std::printf("Source: %u Hz, %u-bit, %u channel%s, %.3f s\n", o.sourceFormat.samplesPerSec,
-                o.sourceFormat.bitsPerSample, o.sourceFormat.channels, o.sourceFormat.channels == 1 ? "" : "s",
-                double(o.sourceDuration));
-    std::printf("Analysed: %.3f s in %u blocks of %.6f s\n", songDuration(), song.blockCount, song.sampleBlockDuration);
+    if (song.notesOnly) {
+        std::printf("MIDI file: %.3f s, %d part%s:", songDuration(), midiImport.partCount,
+                    midiImport.partCount == 1 ? "" : "s");
+        for (int p = 0; p < midiImport.partCount; p++)
+            std::printf("%s %s", p ? "," : "", midiImport.parts[p].name.c_str());
+        std::printf("\n");
+    } else {
+        std::printf("Source: %u Hz, %u-bit, %u channel%s, %.3f s\n", o.sourceFormat.samplesPerSec,
+                    o.sourceFormat.bitsPerSample, o.sourceFormat.channels, o.sourceFormat.channels == 1 ? "" : "s",
+                    double(o.sourceDuration));
+        std::printf("Analysed: %.3f s in %u blocks of %.6f s\n", songDuration(), song.blockCount,
+                    song.sampleBlockDuration);
+    }
     if (noteList.count == 0) {
         std::printf("Notes: none found\n");
         return;
@@ -153,8 +170,10 @@ static int writeOutputs(const OpenRequest& request) {
         else written = 0;
     }
     if (!request.midiPath.empty()) {
-        if (saveMidiFile(request.midiPath, request.detail ? 1 : 0, 0))
-            std::printf("MIDI file: %s (%s)\n", request.midiPath.c_str(), request.detail ? "detail" : "plain");
+        // The notes of a MIDI file have no sung pitch for a detail file to follow.
+        bool detail = request.detail && !song.notesOnly;
+        if (saveMidiFile(request.midiPath, detail ? 1 : 0, 0))
+            std::printf("MIDI file: %s (%s)\n", request.midiPath.c_str(), detail ? "detail" : "plain");
         else written = 0;
     }
     if (!request.wavePath.empty()) {
@@ -189,6 +208,16 @@ int runOpenCommand(const std::vector<std::string>& arguments) {
     if (request.pitchRange >= 0) generalSettings.pitchRange = request.pitchRange;
     if (request.enhanced) generalSettings.enhancedPitchAccuracy = true;
     if (request.boost) globalSettings.boostSpeed = true;
+    if (isMidiFileName(request.input)) {
+        // The file's notes become a song of notes only, read on the main thread as Open does.
+        int result = EXIT_FAILED;
+        if (importMidiFile(request.input)) {
+            printSummary(request);
+            result = writeOutputs(request) ? 0 : EXIT_FAILED;
+        }
+        closeSong();
+        return result;
+    }
     openWaveFile(request.input);
     if (!audioActivity.opening) {
         closeSong();
