@@ -10,7 +10,6 @@
 #include <QMdiArea>
 #include <QMdiSubWindow>
 #include <QMenuBar>
-#include <QMessageBox>
 #include <QPainter>
 #include <QScreen>
 #include <QSessionManager>
@@ -22,6 +21,8 @@
 
 #include "app/appStyle.h"
 #include "app/fileDialogs.h"
+#include "app/helpWindow.h"
+#include "app/instrumentWindow.h"
 #include "app/songWindow.h"
 #include "audio/audioActivity.h"
 #include "notes/displayModes.h"
@@ -332,6 +333,7 @@ void MainFrame::frameCommand(int id) {
     case CMD_HELP: showHelp(); break;
     case CMD_RECORDING_TIPS: showRecordingTips(); break;
     case CMD_ABOUT: showAbout(); break;
+    case CMD_INSTRUMENTS: showInstrumentWindow(this); break;
     // The preferences dialog with its recording source page belongs to the preferences,
     // which this version does not have.
     case CMD_RECORDING_SOURCE:
@@ -456,51 +458,8 @@ QToolButton* MainFrame::toolbarButton(int which) const { return which >= 0 && wh
 
 // ---- Help, recording tips and About ----
 
-static void showDocument(QWidget* parent, const QString& title, const QString& html) {
-    QMessageBox box(QMessageBox::NoIcon, title, html, QMessageBox::Ok, parent);
-    box.setObjectName("document");
-    box.setTextFormat(Qt::RichText);
-    box.setIconPixmap(appIcon(ICON_PROGRAM).pixmap(48, 48));
-    box.exec();
-}
+void MainFrame::showHelp() { showHelpWindow(this, HELP_PAGE_HELP); }
 
-void MainFrame::showHelp() {
-    showDocument(this, "Torvellan Melodrift Help",
-                 "<h3>Torvellan Melodrift</h3>"
-                 "<p>Melodrift corrects the pitch, timing and loudness of a recorded melody. A song is "
-                 "opened from a wave file (<b>File &gt; Open...</b>, Ctrl+O) or recorded "
-                 "(<b>File &gt; Record Audio...</b>, Space); its notes are recognised and listed in the "
-                 "song's window.</p>"
-                 "<p><b>Modes.</b> <i>Wave</i> plays and saves the corrected recording, <i>MIDI</i> the "
-                 "notes as MIDI. <i>Detail</i> edits the sung pitch curve, <i>Note</i> whole notes. "
-                 "The toolbar's buttons switch between them.</p>"
-                 "<p><b>Editing.</b> Select notes, then use the <b>Notes</b> menu: split and join, "
-                 "quantize or flatten the pitch, change timing (Wave mode) and volume.</p>"
-                 "<p><b>Keys.</b> Ctrl+O open, Ctrl+S save, Space record, Ctrl+Q quantize, Ctrl+F "
-                 "flatten, Ctrl+L split, Ctrl+J join, Ctrl+E strip the song's silent ends, "
-                 "Ctrl+Num+ and Ctrl+Num&minus; zoom.</p>"
-                 "<p>Commands this version does not have yet say so when chosen.</p>");
-}
+void MainFrame::showRecordingTips() { showHelpWindow(this, HELP_PAGE_RECORDING_TIPS); }
 
-void MainFrame::showRecordingTips() {
-    showDocument(this, "Recording Tips",
-                 "<h3>Recording Tips</h3>"
-                 "<ul>"
-                 "<li>Record one voice or instrument at a time: Melodrift follows a single melody line.</li>"
-                 "<li>Choose a quiet room and keep a steady distance of about a hand's width to the "
-                 "microphone.</li>"
-                 "<li>Set the recording level so that the loudest notes come close to the top of the "
-                 "meter without reaching it.</li>"
-                 "<li>Leave a second of silence before the first note and after the last one.</li>"
-                 "<li>Sing or play cleanly separated notes where you can; smooth slides are kept as "
-                 "detail of the pitch curve.</li>"
-                 "</ul>");
-}
-
-void MainFrame::showAbout() {
-    showDocument(this, "About Torvellan Melodrift",
-                 QString("<h3>Torvellan Melodrift</h3><p>Version %1</p>"
-                         "<p>Corrects the pitch, timing and loudness of a recorded melody.</p>"
-                         "<p style='color:#7a8490'>Built with Qt %2.</p>")
-                     .arg(MELODRIFT_VERSION, qVersion()));
-}
+void MainFrame::showAbout() { showAboutBox(this); }

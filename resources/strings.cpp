@@ -7,6 +7,7 @@ struct ResourceStringEntry {
 };
 
 static const ResourceStringEntry resourceStrings[] = {
+    {189, "Instrument recordings"},
     {10230, "File could not be closed"},
     {10231, "File could not be seeked"},
     {10232, "Bytes were not stored properly"},

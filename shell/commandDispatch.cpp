@@ -81,7 +81,8 @@ int dispatchCommand(int command) {
     case CMD_CLOSE_ALL:
     case CMD_HELP:
     case CMD_RECORDING_TIPS:
-    case CMD_ABOUT: return COMMAND_FOR_FRAME;
+    case CMD_ABOUT:
+    case CMD_INSTRUMENTS: return COMMAND_FOR_FRAME;
 
     case CMD_RECORD: recordCommand(); return COMMAND_DONE;
     case CMD_PLAY_STOP: playCommand(); return COMMAND_DONE;

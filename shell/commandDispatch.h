@@ -13,7 +13,7 @@
 enum CommandResult {
     COMMAND_DONE = 0,        // handled here (an operation that did nothing by its guard included)
     COMMAND_FOR_FRAME = 1,   // the desktop program handles it: Open, Close, Save, Save As, Exit,
-                             // the Window and Help commands, the preferences
+                             // the Window and Help commands, the preferences, the instrument window
     COMMAND_FILTERED = 2     // dropped: the frame is modal, or the id is no command of ours
 };
 int dispatchCommand(int command);

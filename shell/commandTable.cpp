@@ -60,6 +60,7 @@ const CommandEntry commandTable[] = {
     {CMD_TILE_HORIZONTALLY, "Tile &Horizontally", 0, true},
     {CMD_TILE_VERTICALLY, "Tile &Vertically", 0, true},
     {CMD_CLOSE_ALL, "Close &All", 0, true},
+    {CMD_INSTRUMENTS, "&Instrument Definitions...", 0, false},
     {CMD_HELP, "Torvellan Melodrift &Help...\tF1", 0, false},
     {CMD_RECORDING_TIPS, "R&ecording Tips...", 0, false},
     {CMD_ABOUT, "&About Torvellan Melodrift...", 0, false},
@@ -162,6 +163,8 @@ const MenuItem menuBar[] = {
     {MENU_COMMAND, CMD_TILE_HORIZONTALLY, nullptr},
     {MENU_COMMAND, CMD_TILE_VERTICALLY, nullptr},
     {MENU_COMMAND, CMD_CLOSE_ALL, nullptr},
+    {MENU_SEPARATOR, 0, nullptr},
+    {MENU_COMMAND, CMD_INSTRUMENTS, nullptr},
     {MENU_END, 0, nullptr},
 
     {MENU_POPUP, POPUP_HELP, "&Help"},

@@ -67,6 +67,8 @@ enum CommandId {
     CMD_HELP = 42005,
     CMD_RECORDING_TIPS = 42064,
     CMD_ABOUT = 40002,
+    // The instrument window, which the desktop program offers in its Window menu.
+    CMD_INSTRUMENTS = 42201,
     // Reached only through the accelerator table: commands of the score scanning code, which
     // do nothing for a song. Named by their keys.
     CMD_SCANNING_CTRL_P = 57607,

@@ -272,7 +272,7 @@ private slots:
 
         QFileDialog* open = createOpenDialog(frame);
         QCOMPARE(open->fileMode(), QFileDialog::ExistingFiles);
-        QCOMPARE(open->nameFilters(), QStringList({"Wave audio files (*.wav)"}));
+        QCOMPARE(open->nameFilters(), QStringList({"Wave audio files (*.wav)", "MIDI files (*.mid *.midi)"}));
         delete open;
     }
 

@@ -67,6 +67,7 @@ TEST(CommandTable, EveryMenuItemHasItsExactTextAndKey) {
         {40004, "Tile &Horizontally"},
         {40005, "Tile &Vertically"},
         {40006, "Close &All"},
+        {42201, "&Instrument Definitions..."},
         {42005, "Torvellan Melodrift &Help...\tF1"},
         {42064, "R&ecording Tips..."},
         {40002, "&About Torvellan Melodrift..."},
