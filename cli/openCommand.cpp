@@ -132,10 +132,10 @@ static void printSummary(const OpenRequest& request) {
     const OpeningState& o = openingState;
     std::printf("File: %s\n", request.input.c_str());
     if (song.notesOnly) {
-        std::printf("MIDI file: %.3f s, %d part%s:", songDuration(), midiImport.partCount,
+        std::printf("MIDI file: %.3f s, %d part%s", songDuration(), midiImport.partCount,
                     midiImport.partCount == 1 ? "" : "s");
         for (int p = 0; p < midiImport.partCount; p++)
-            std::printf("%s %s", p ? "," : "", midiImport.parts[p].name.c_str());
+            std::printf("%s %s", p ? "," : ":", midiImport.parts[p].name.c_str());
         std::printf("\n");
     } else {
         std::printf("Source: %u Hz, %u-bit, %u channel%s, %.3f s\n", o.sourceFormat.samplesPerSec,
