@@ -6,10 +6,12 @@
 #include "audio/openWaveFile.h"
 #include "notes/displayModes.h"
 #include "platform/ui.h"
+#include "shell/closeSong.h"
 #include "shell/commandTable.h"
 #include "shell/mainFrame.h"
 #include "shell/menuEnabling.h"
 #include "shell/zoom.h"
+#include "store/song.h"
 
 std::string notAvailableText(const std::string& what) {
     return what + " is not available in this version of Torvellan Melodrift.";
@@ -45,6 +47,12 @@ static void recordCommand() {
     if (!commandOperations.toggleRecording) {
         reportNotAvailable(CMD_RECORD);
         return;
+    }
+    // A song of notes read from a MIDI file has no recording to add to: a recording starts a
+    // song of its own.
+    if (!audioActivity.recording && song.notesOnly) {
+        closeSong();
+        resetSongNames();
     }
     commandOperations.toggleRecording();
 }

@@ -176,3 +176,20 @@ TEST_F(CommandTableDispatch, TheScanningKeysDoNothingAndUnknownIdsAreNotCommands
     EXPECT_EQ(messageCount(), 0);
     EXPECT_EQ(dispatchCommand(12345), COMMAND_FILTERED);
 }
+
+TEST_F(CommandTableDispatch, ARecordingOverASongOfNotesOnlyStartsASongOfItsOwn) {
+    static int notesAtStart;
+    openSong(256, 3);
+    commandOperations.toggleRecording = [] {
+        notesAtStart = noteList.count;
+        return 1;
+    };
+    song.notesOnly = true;
+    EXPECT_EQ(dispatchCommand(CMD_RECORD), COMMAND_DONE);
+    EXPECT_EQ(notesAtStart, 0);
+    EXPECT_EQ(song.blockCount, 0u);
+    // A song with a recording is recorded onto.
+    openSong(256, 3);
+    EXPECT_EQ(dispatchCommand(CMD_RECORD), COMMAND_DONE);
+    EXPECT_EQ(notesAtStart, 3);
+}
