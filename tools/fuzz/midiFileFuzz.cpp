@@ -76,10 +76,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     useOwnFolder();
     std::string input = folder + "input.mid";
     std::string saved = folder + "saved.mid";
-    FILE* f = std::fopen(input.c_str(), "wb");
-    if (!f) return 0;
-    size_t written = size ? std::fwrite(data, 1, size, f) : 0;
-    if (std::fclose(f) != 0 || written != size) return 0;
+    if (!fuzzWriteFile(input, data, size)) return 0;
 
     emptySong();
     clearUiCalls();
