@@ -406,7 +406,7 @@ int analyseLearningFile(const std::string& path, LearningRecording* recording) {
     recording->lowAmplitudesRemoved = 0;
     // The analysis writes into the song's stores; an open song's blocks would be mixed in.
     if (song.blockCount > 0) {
-        showMessage(MESSAGE_ERROR, "Please close the song before learning instruments.");
+        showMessage(MESSAGE_ERROR, CLOSE_SONG_BEFORE_LEARNING_TEXT);
         return 0;
     }
     std::string fileName = fileNameOf(path);

@@ -23,6 +23,8 @@ constexpr int MAX_LEARNING_NOTES = 128;       // notes looked for in one recordi
 constexpr int MAX_IGNORE_FREQUENCIES = 256;   // frequencies one note may pass over
 constexpr uint32_t LEARNING_NOTE_LEVEL = 64;  // a note's loudest block must sum above this
 constexpr double LEARNING_NOTE_SECONDS = 0.08;   // and it must last at least this long
+// Learning analyses in the song's stores, so no song may be open.
+constexpr const char* CLOSE_SONG_BEFORE_LEARNING_TEXT = "Please close the song before learning instruments.";
 constexpr double HARMONIC_GATHER_DIVISOR = 51.95146;  // entries within f / this (a third of a semitone) form a harmonic
 constexpr int HARMONIC_MIN_BLOCKS = 3;        // consecutive blocks a harmonic must be present in
 

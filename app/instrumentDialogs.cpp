@@ -24,6 +24,7 @@
 #include "resources/strings.h"
 #include "shell/commandTable.h"
 #include "shell/settings.h"
+#include "store/song.h"
 
 // The filter name of the learning dialog.
 static const int LEARN_FILTER_STRING = 189;
@@ -103,8 +104,13 @@ struct Waiting {
 };
 
 int learnDefinitionsFromDialog(QWidget* parent, int replace) {
-    // Learning analyses in the song's stores, which a recording or an opening is filling.
+    // Learning analyses in the song's stores, which a recording or an opening is filling; an
+    // open song is said once, not once for every recording chosen.
     if (refuseWhileBusy()) return 0;
+    if (song.blockCount > 0) {
+        showMessage(MESSAGE_ERROR, CLOSE_SONG_BEFORE_LEARNING_TEXT);
+        return 0;
+    }
     QFileDialog* dialog = createLearnDialog(parent, replace);
     QStringList files;
     if (dialog->exec() == QDialog::Accepted) files = dialog->selectedFiles();
