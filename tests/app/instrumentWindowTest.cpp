@@ -168,6 +168,16 @@ private slots:
         delete learn;
     }
 
+    void learningWithASongOpenSaysSoOnceBeforeAskingForRecordings() {
+        makeSong(64, 1);
+        QCOMPARE(learnDefinitionsFromDialog(nullptr, 0), 0);
+        QCOMPARE(messageCount(), 1);
+        QCOMPARE(lastMessageText(), std::string("Please close the song before learning instruments."));
+        audioActivity.opening = true;
+        QCOMPARE(learnDefinitionsFromDialog(nullptr, 1), 0);
+        QCOMPARE(lastMessageText(), std::string(WHILST_OPENING_TEXT));
+    }
+
     void recognitionOptionsAreTakenOnOkOnly() {
         {
             RecognitionOptionsDialog dialog(nullptr, true);
