@@ -20,14 +20,21 @@ wave="$run/$name.wav"
 notes="$run/$name.notes.csv"
 # Never write the song over the file it is read from.
 if [ "$(realpath -m "$file")" = "$(realpath -m "$wave")" ]; then wave="$run/$name.song.wav"; fi
+if [ "$(realpath -m "$file")" = "$(realpath -m "$midi")" ]; then midi="$run/$name.song.mid"; fi
+# A MIDI file gives notes and no recording: there is no wave to save.
+outputs=(--midi "$midi" --notes-csv "$notes")
+recording=1
+case "${file,,}" in
+  *.mid | *.midi) recording=0 ;;
+  *) outputs+=(--wave "$wave") ;;
+esac
 
-"$top/build/melodrift-cli" --shared "$run" --config "$run/config" open "$file" \
-  --midi "$midi" --wave "$wave" --notes-csv "$notes"
+"$top/build/melodrift-cli" --shared "$run" --config "$run/config" open "$file" "${outputs[@]}"
 
-# The demo comes with its true notes: say how many of them were found (same semitone, onset
-# within 0.15 s).
+# The demo recording comes with its true notes: say how many of them were found (same
+# semitone, onset within 0.15 s). They are the recording's, timed from its lead-in.
 truth="$(dirname "$file")/$name.notes.csv"
-if [ -f "$truth" ] && [ "$(realpath "$truth")" != "$(realpath -m "$notes")" ]; then
+if [ "$recording" = 1 ] && [ -f "$truth" ] && [ "$(realpath "$truth")" != "$(realpath -m "$notes")" ]; then
   awk -F, 'FNR == 1 { next }
     FILENAME == ARGV[1] { onset[++n] = $1; pitch[n] = $3; next }
     { found[++m] = $1; foundPitch[m] = $3 }
