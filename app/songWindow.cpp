@@ -18,6 +18,7 @@
 #include "shell/commandTable.h"
 #include "shell/mainFrame.h"
 #include "shell/settings.h"
+#include "store/song.h"
 
 SongWindow::SongWindow(QWidget* parent) : QWidget(parent) {
     setObjectName("songWindow");
@@ -80,14 +81,21 @@ void SongWindow::showEvent(QShowEvent* event) {
     // The meter is a tool window of the frame, created with the view the first time it shows.
     if (!meter) {
         meter = new MeterWindow(window(), view);
-        meter->show();
+        showMeterForSong();
     }
+}
+
+// A song of notes read from a MIDI file has no input whose level the meter could show.
+void SongWindow::showMeterForSong() {
+    bool wanted = !song.notesOnly;
+    if (meter && isVisible() && meter->isVisible() != wanted) meter->setVisible(wanted);
 }
 
 void SongWindow::refresh() {
     showModeButtons(buttons[0], buttons[1], buttons[2]);
     buttons[3]->setText(playbackRunning() ? "Stop" : "Play");
     view->songChanged();
+    showMeterForSong();
     if (meter) meter->update();
 }
 

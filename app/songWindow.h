@@ -1,8 +1,9 @@
 #pragma once
 // The song's child window in the MDI area (window class WaveviewM, titled "Waveview display"):
 // a 26-pixel toolbar with the playback mode, note mode and layout buttons and Play, the song
-// view's drawing window below it, and the level meter beside it. Asked to close, it answers
-// with the song's close guard and closes the song when it goes.
+// view's drawing window below it, and the level meter beside it (hidden for a song of notes
+// only, which has no input level). Asked to close, it answers with the song's close guard and
+// closes the song when it goes.
 
 #include <QPointer>
 
@@ -32,6 +33,7 @@ protected:
 
 private:
     void runCommand(int id);
+    void showMeterForSong();
 
     QToolBar* toolbar;
     QToolButton* buttons[5] = {};

@@ -23,6 +23,7 @@
 #include "app/instrumentWindow.h"
 #include "app/mainFrame.h"
 #include "app/recognitionOptionsDialog.h"
+#include "app/songWindow.h"
 #include "app/songViewPainter.h"
 #include "appTestSupport.h"
 #include "playback/instrumentView.h"
@@ -240,6 +241,9 @@ private slots:
         QVERIFY(frame.songWindow());
         QCOMPARE(noteList.count, 2);
         QCOMPARE(displayModes.playbackMode, PLAYBACK_MODE_MIDI);
+        // No input level to show for a song of notes only.
+        QVERIFY(frame.songWindow()->meterWindow());
+        QVERIFY(!frame.songWindow()->meterWindow()->isVisible());
         // Detail mode has no sung pitch to draw: the notes are bars.
         QImage image(LABEL_COLUMN_WIDTH + 600, 500, QImage::Format_RGB32);
         QVERIFY(paintSongView(image));
