@@ -426,20 +426,41 @@ static int makeNotesTimeAxis() {
     return 1;
 }
 
+// Block lookups for times that never go back: each walks on from a block boundary before the
+// last time asked, so that a run of lookups walks the song once.
+struct BlockCursor {
+    uint32_t block = 0;   // a block boundary ...
+    double time = 0.0;    // ... and its time
+
+    // The block boundary nearest to t, which must not lie before the last time asked.
+    uint32_t nearest(double t) {
+        uint32_t k = blockAtTime(t, block, time);
+        // The boundary before the nearest lies before t: the nearest may lie after it.
+        if (k > block + 1) {
+            time += songTimeOfBlock(k - 1, block);
+            block = k - 1;
+        }
+        return k;
+    }
+};
+
 // Each note's volumeSum, as the song's blocks count it, gives back the note's velocity when the
 // note is written as MIDI again: the smallest sum whose level per block reaches it.
 static void setNoteVolumes() {
-    uint32_t cursorBlock = 0;
-    double cursorTime = 0.0;
+    // Notes are in start order; their ends are looked up in end order, so that long notes
+    // that overlap do not each walk the song from their start to their end.
+    std::vector<int> byEnd(size_t(noteList.count));
+    for (int i = 0; i < noteList.count; i++) byEnd[size_t(i)] = i;
+    std::stable_sort(byEnd.begin(), byEnd.end(),
+                     [](int a, int b) { return noteList.notes[a].midiEnd < noteList.notes[b].midiEnd; });
+    std::vector<uint32_t> lastBlock(size_t(noteList.count));
+    BlockCursor ends;
+    for (int i : byEnd) lastBlock[size_t(i)] = ends.nearest(noteList.notes[i].midiEnd);
+
+    BlockCursor starts;
     for (int i = 0; i < noteList.count; i++) {
         Note& note = noteList.notes[i];
-        // Notes are in start order: the walk to each start goes on from the last one.
-        uint32_t first = blockAtTime(note.midiStart, cursorBlock, cursorTime);
-        if (first > cursorBlock + 1) {
-            cursorTime += songTimeOfBlock(first - 1, cursorBlock);
-            cursorBlock = first - 1;
-        }
-        int64_t blocks = int64_t(blockAtTime(note.midiEnd, cursorBlock, cursorTime)) - int64_t(first);
+        int64_t blocks = int64_t(lastBlock[size_t(i)]) - int64_t(starts.nearest(note.midiStart));
         if (blocks < 1) blocks = 1;
         int velocity = std::clamp(int(note.recognitionValues[0]), 1, 127);
         uint64_t low = 0, high = 255 * uint64_t(blocks);
