@@ -46,6 +46,7 @@ struct MidiRange {
     uint32_t endBlock;      // block at e, the range's end
     uint32_t cursorBlock;   // a block boundary at or before the note being written ...
     double cursorTime;      // ... and its time: block lookups walk on from here, not from block 0
+    std::vector<uint32_t> endBlocks;   // the block boundary nearest to each note's end
 };
 
 // The block boundary nearest to t. Notes are in time order, so the walk begins at the cursor
@@ -77,8 +78,35 @@ static uint32_t ticksOf(double offset) {
 
 static uint32_t tickAt(const MidiRange& range, double t) { return ticksOf(t - range.start); }
 
-static int noteTaken(const Note& note, const MidiRange& range) {
-    return blockOf(range, note.midiStart) < range.endBlock && range.firstBlock < blockOf(range, note.midiEnd);
+// Fills range.endBlocks. The ends are looked up in the order of their times with a cursor of
+// their own: notes that overlap for long would otherwise each walk the song from their start
+// to their end. 1; 0 after the memory message.
+static int findNoteEndBlocks(MidiRange& range) {
+    std::vector<int> byEnd;
+    if (!tryResize(range.endBlocks, size_t(noteList.count)) ||
+        !tryAllocate([&] { byEnd.reserve(range.endBlocks.size()); })) {
+        showMessage(MESSAGE_ERROR, resourceString(10401));
+        return 0;
+    }
+    for (int i = 0; i < noteList.count; i++) {
+        double end = noteList.notes[i].midiEnd;
+        // An end that is no time at all is walked from the start, as any lookup before the cursor.
+        if (std::isnan(end)) range.endBlocks[size_t(i)] = blockAtTime(end);
+        else byEnd.push_back(i);
+    }
+    std::stable_sort(byEnd.begin(), byEnd.end(),
+                     [](int a, int b) { return noteList.notes[a].midiEnd < noteList.notes[b].midiEnd; });
+    MidiRange cursor{range.start, range.firstBlock, range.endBlock, 0, 0.0, {}};
+    for (int i : byEnd) {
+        double end = noteList.notes[i].midiEnd;
+        range.endBlocks[size_t(i)] = blockOf(cursor, end);
+        advanceCursor(cursor, end);
+    }
+    return 1;
+}
+
+static int noteTaken(int i, const MidiRange& range) {
+    return blockOf(range, noteList.notes[i].midiStart) < range.endBlock && range.firstBlock < range.endBlocks[size_t(i)];
 }
 
 static double onTime(const Note& note, const MidiRange& range) {
@@ -86,8 +114,9 @@ static double onTime(const Note& note, const MidiRange& range) {
 }
 
 // The note's average block level over the part being written, as a velocity.
-static int noteVelocity(const Note& note, const MidiRange& range, double tOn) {
-    int64_t blocks = int64_t(blockOf(range, note.midiEnd)) - int64_t(blockOf(range, tOn));
+static int noteVelocity(int i, const MidiRange& range, double tOn) {
+    const Note& note = noteList.notes[i];
+    int64_t blocks = int64_t(range.endBlocks[size_t(i)]) - int64_t(blockOf(range, tOn));
     // A note narrower than a block boundary step would divide by zero; it counts as one block.
     if (blocks < 1) blocks = 1;
     return velocityFromLevel(float(note.volumeSum) / float(blocks));
@@ -135,10 +164,10 @@ static int writePlainNotes(MidiFileWriter& w, int channel, MidiRange& range) {
     for (int i = 0; i < noteList.count; i++) {
         const Note& note = noteList.notes[i];
         advanceCursor(range, note.midiStart);
-        if (!noteTaken(note, range)) continue;
+        if (!noteTaken(i, range)) continue;
         double tOn = onTime(note, range);
         int key = limitKey(note.midiNote);
-        events.push_back({tickAt(range, tOn), MIDI_NOTE_ON, key, noteVelocity(note, range, tOn)});
+        events.push_back({tickAt(range, tOn), MIDI_NOTE_ON, key, noteVelocity(i, range, tOn)});
         int value = bendValue(rawBend(note.pitch, pitchToFrequency(key)));
         if (value != currentBend) {
             events.push_back({tickAt(range, tOn), MIDI_PITCH_BEND, key, value});
@@ -195,9 +224,9 @@ static BlockPitch blockPitch(DetailReader& reader, uint32_t block) {
 static int joinsPrevious(DetailReader& reader, int j, const MidiRange& range) {
     const Note& before = noteList.notes[j - 1];
     const Note& note = noteList.notes[j];
-    if (!noteTaken(note, range)) return 0;
+    if (!noteTaken(j, range)) return 0;
     if (double(note.midiStart) > double(before.midiEnd) + song.sampleBlockDuration / 2) return 0;
-    uint32_t beforeEnd = blockOf(range, before.midiEnd);
+    uint32_t beforeEnd = range.endBlocks[size_t(j - 1)];
     if (beforeEnd == 0) return 0;
     BlockPitch last = blockPitch(reader, beforeEnd - 1);
     BlockPitch first = blockPitch(reader, blockOf(range, note.midiStart));
@@ -244,9 +273,9 @@ static int writeDetailStretch(MidiFileWriter& w, int channel, const MidiRange& r
     const Note& closing = noteList.notes[last];
     double tOn = onTime(opening, range);
     uint32_t fromBlock = blockOf(range, tOn);
-    uint32_t toBlock = blockOf(range, closing.midiEnd);
+    uint32_t toBlock = range.endBlocks[size_t(last)];
     if (toBlock > song.blockCount) toBlock = song.blockCount;
-    int velocity = noteVelocity(opening, range, tOn);
+    int velocity = noteVelocity(first, range, tOn);
 
     std::vector<BlockPitch> blocks;
     if (toBlock > fromBlock) {
@@ -305,7 +334,7 @@ static int writeDetailNotes(MidiFileWriter& w, int channel, MidiRange& range, De
     int i = 0;
     while (i < noteList.count) {
         advanceCursor(range, noteList.notes[i].midiStart);
-        if (!noteTaken(noteList.notes[i], range)) {
+        if (!noteTaken(i, range)) {
             i++;
             continue;
         }
@@ -339,6 +368,7 @@ static int writeMidiFile(const std::string& path, int detail, double start, doub
     range.endBlock = blockAtTime(end < 0.0 ? songDuration() : end);
     range.cursorBlock = 0;
     range.cursorTime = 0.0;
+    if (!findNoteEndBlocks(range)) return 0;
 
     MidiFileWriter w;
     if (!createMidiFile(w, path)) {
