@@ -8,15 +8,7 @@ set -u
 cli=$1
 wave=$2
 truth=${wave%.wav}.notes.csv
-work=$(mktemp -d "${TMPDIR:-/tmp}/melodrift-cli-test.XXXXXX")
-trap 'rm -rf "$work"' EXIT INT TERM
-failures=0
-fail() {
-    echo "FAIL: $*" >&2
-    failures=$((failures + 1))
-}
-# The program's own working files and settings stay in the test's folder.
-run() { "$cli" --shared "$work" --config "$work/config" "$@"; }
+. "$(dirname "$0")/cliTestSupport.sh" melodrift-cli-test
 
 run analyse "$wave" --notes-csv "$work/notes.csv" --pitch-csv "$work/pitch.csv" --ft-csv "$work/ft.csv" \
     >"$work/out.txt" 2>"$work/err.txt" || fail "analyse of the demo exited with $?: $(cat "$work/err.txt")"

@@ -8,14 +8,7 @@ set -u
 cli=$1
 midi=$2
 truth=${midi%.mid}.notes.csv
-work=$(mktemp -d "${TMPDIR:-/tmp}/melodrift-cli-midi.XXXXXX")
-trap 'rm -rf "$work"' EXIT INT TERM
-failures=0
-fail() {
-    echo "FAIL: $*" >&2
-    failures=$((failures + 1))
-}
-run() { "$cli" --shared "$work" --config "$work/config" "$@"; }
+. "$(dirname "$0")/cliTestSupport.sh" melodrift-cli-midi
 
 run open "$midi" --notes-csv "$work/notes.csv" --midi "$work/again.mid" >"$work/out.txt" 2>"$work/err.txt" \
     || fail "open of the demo's MIDI file exited with $?: $(cat "$work/err.txt")"
