@@ -6,6 +6,7 @@
 #include "audio/openWaveFile.h"
 #include "notes/displayModes.h"
 #include "playback/midiOutput.h"
+#include "playback/playback.h"
 #include "platform/ui.h"
 #include "shell/commandTable.h"
 #include "shell/mainFrame.h"
@@ -17,6 +18,8 @@ CommandOperations commandOperations = [] {
     CommandOperations operations{};
     operations.openWaveFile = openWaveFile;
     operations.writeNotesMidiFile = saveMidiFile;
+    operations.playSong = playSong;
+    operations.pausePlayback = pausePlayback;
     return operations;
 }();
 
@@ -29,6 +32,8 @@ void reportNotAvailable(int command) { showMessage(MESSAGE_INFORMATION, notAvail
 static void editCommand(int command) {
     // The Edit menu speaks to the song's window; without it there is nothing to edit.
     if (!commandEnabled(command, currentMenuState())) return;
+    // A note preview never plays on while the song changes under it.
+    stopPreview();
     if (!commandOperations.handleSongViewCode) {
         reportNotAvailable(command);
         return;
@@ -38,6 +43,7 @@ static void editCommand(int command) {
 
 static void noteCommand(int command) {
     if (!commandEnabled(command, currentMenuState())) return;
+    stopPreview();
     if (!commandOperations.runNoteCommand) {
         reportNotAvailable(command);
         return;

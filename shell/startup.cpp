@@ -13,6 +13,7 @@
 #include "platform/mainloop.h"
 #include "platform/sync.h"
 #include "platform/ui.h"
+#include "playback/playback.h"
 #include "shell/appTimers.h"
 #include "shell/mainFrame.h"
 #include "shell/openQueue.h"
@@ -165,6 +166,8 @@ static void deleteDocumentTemporaries() {
 }
 
 int shutDown(int exitCode) {
+    // Nothing sounds on after the program, and its playback files go with the song.
+    stopPlayback();
     setCaptureEventHandler(nullptr);
     resetOpenQueue();
     resetAppTimers();

@@ -367,7 +367,7 @@ TEST_F(WaveSegment, OutputThatCannotBeCreatedShowsCannotAndThePath) {
 }
 
 TEST_F(WaveSegment, FailedCopyIsReportedAndTheWorkingFileMaskedAgain) {
-    failFileCall(FILE_OP_WRITE, 4);   // unmasking, header, first piece, second piece
+    failFileCall(FILE_OP_WRITE, 3);   // unmasking, header, the samples
     EXPECT_EQ(writeWaveSegment(out, -1.0, -1.0), 0);
     EXPECT_EQ(lastMessageText(), "Bytes were not stored properly");
     expectWorkingFileAtRest();
