@@ -14,6 +14,8 @@
 #include "app/mainFrame.h"
 #include "app/splash.h"
 #include "platform/mainloop.h"
+#include "platform/media.h"
+#include "platform/pulse/pulseBackends.h"
 #include "platform/qt/qtMainLoop.h"
 #include "platform/qt/qtUi.h"
 #include "platform/ui.h"
@@ -43,10 +45,13 @@ static int startGraphics() {
     applyAppStyle(*qApp);
     installQtUi();
     installQtMainLoop();
+    // Without a sound server Play says so; nothing else needs it.
+    installPulseMedia();
     return 1;
 }
 
 static void stopGraphics() {
+    setMediaBackend(nullptr);
     setUiBackend(nullptr);
     stopQtTimers();
     setMainLoopBackend(nullptr);

@@ -185,16 +185,11 @@ void paintNoteBar(Painting& p, const QRectF& r, bool selected) {
 
 // The notes as bars at midiNote (Note mode), or as a light band under the pitch curve (Detail).
 void paintNotes(Painting& p) {
-    bool wave = displayModes.playbackMode == PLAYBACK_MODE_WAVE;
     bool detail = displayModes.noteMode == NOTE_MODE_DETAIL;
     double h = noteBarHeight();
     for (int i = 0; i < noteList.count; i++) {
-        const Note& n = noteList.notes[i];
-        double start = wave ? n.waveStart : n.midiStart, end = wave ? n.waveEnd : n.midiEnd;
-        int x0 = timeToX(start), x1 = timeToX(end);
-        if (x1 < songViewGeometry.plotLeft || x0 > p.width) continue;
-        double y = pitchToY(pitchToFrequency(n.midiNote));
-        QRectF r(x0 + 0.5, y - h / 2, std::max(2, x1 - x0 - 1), h);
+        QRectF r = noteBarRect(i);
+        if (r.right() < songViewGeometry.plotLeft || r.left() > p.width) continue;
         bool selected = isNoteSelected(i) == 1;
         if (!detail) {
             paintNoteBar(p, r, selected);
@@ -288,6 +283,15 @@ void paintInfoStrip(Painting& p) {
 }
 
 }  // namespace
+
+QRectF noteBarRect(int index) {
+    const Note& n = noteList.notes[index];
+    bool wave = displayModes.playbackMode == PLAYBACK_MODE_WAVE;
+    int x0 = timeToX(wave ? n.waveStart : n.midiStart), x1 = timeToX(wave ? n.waveEnd : n.midiEnd);
+    double h = noteBarHeight();
+    double y = pitchToY(pitchToFrequency(n.midiNote));
+    return QRectF(x0 + 0.5, y - h / 2, std::max(2, x1 - x0 - 1), h);
+}
 
 int paintSongView(QImage& image) {
     if (image.isNull()) return 0;

@@ -11,7 +11,7 @@
 #include "app/mainFrame.h"
 #include "app/songView.h"
 #include "notes/displayModes.h"
-#include "playback/playbackState.h"
+#include "playback/playback.h"
 #include "playback/pointerInfo.h"
 #include "playback/songViewGeometry.h"
 #include "shell/commandDispatch.h"
@@ -86,7 +86,7 @@ void SongWindow::showEvent(QShowEvent* event) {
 
 void SongWindow::refresh() {
     showModeButtons(buttons[0], buttons[1], buttons[2]);
-    buttons[3]->setText(playbackRunning() ? "Stop" : "Play");
+    buttons[3]->setText(playButtonLabel());
     view->songChanged();
     if (meter) meter->update();
 }
