@@ -1,6 +1,14 @@
 // The table of the command-line tool's commands.
 #include "cli/cliCommands.h"
 
+#include <cstdio>
+#include <cstdlib>
+
+#include "audio/audioActivity.h"
+#include "audio/openWaveFile.h"
+#include "store/song.h"
+#include "store/workingFiles.h"
+
 const std::vector<CliCommand>& cliCommands() {
     static const std::vector<CliCommand> commands = {
         {"info", "FILE", "print the format, size and duration of a wave file", 1, runInfoCommand},
@@ -12,6 +20,9 @@ const std::vector<CliCommand>& cliCommands() {
          "[--pitch-range 0|1|2] [--enhanced] [--boost]",
          "open a wave file as the desktop program does, print its notes, save them as MIDI and the song as a wave",
          1, runOpenCommand},
+        {"play", "FILE [--midi] [--from S] [--to E]",
+         "open a wave file and play the song (its notes with --midi) through the sound server, S to E seconds", 1,
+         runPlayCommand},
         {"learn-instrument", "[--replace] [--output FILE] FILE...",
          "learn instrument definitions from recordings named with their parameters", 1, runLearnInstrumentCommand},
     };
@@ -22,4 +33,25 @@ const CliCommand* findCliCommand(const std::string& name) {
     for (const CliCommand& command : cliCommands())
         if (name == command.name) return &command;
     return nullptr;
+}
+
+bool parseSeconds(const std::string& text, double* seconds) {
+    char* after = nullptr;
+    double value = std::strtod(text.c_str(), &after);
+    if (after == text.c_str() || *after != '\0' || !(value >= 0)) return false;
+    *seconds = value;
+    return true;
+}
+
+int openSongFromCommandLine(const std::string& input) {
+    openWaveFile(input);
+    if (!audioActivity.opening) {
+        closeSong();
+        return 0;   // refused; the message is on stderr
+    }
+    waitForOpeningToEnd();
+    if (song.blockCount > 0) return 1;
+    std::fprintf(stderr, "melodrift-cli: %s holds less than one block of audio\n", input.c_str());
+    closeSong();
+    return 0;
 }

@@ -15,6 +15,11 @@ struct CliCommand {
 
 const std::vector<CliCommand>& cliCommands();
 const CliCommand* findCliCommand(const std::string& name);
+// Opens input as File > Open does and waits for the opening to end: 1 when the song holds at
+// least one block; 0 after the reason was given (the song is closed again).
+int openSongFromCommandLine(const std::string& input);
+// A number of seconds, 0 or more, as the whole word; false for anything else.
+bool parseSeconds(const std::string& text, double* seconds);
 
 // info FILE: what the wave reader finds in FILE, or why it refuses it.
 int runInfoCommand(const std::vector<std::string>& arguments);
@@ -25,5 +30,7 @@ int runAnalyseCommand(const std::vector<std::string>& arguments);
 // [--pitch-range 0|1|2] [--enhanced] [--boost]: opens IN.wav as the desktop program does,
 // prints its notes and saves them and the song.
 int runOpenCommand(const std::vector<std::string>& arguments);
+// play FILE [--midi] [--from S] [--to E]: opens FILE and plays the song through the sound server.
+int runPlayCommand(const std::vector<std::string>& arguments);
 // learn-instrument [--replace] [--output FILE] FILE...: instrument definitions learnt from recordings.
 int runLearnInstrumentCommand(const std::vector<std::string>& arguments);

@@ -11,7 +11,6 @@
 #include <cstdlib>
 #include <string>
 
-#include "audio/audioActivity.h"
 #include "audio/openWaveFile.h"
 #include "audio/waveWorkingFile.h"
 #include "notes/noteList.h"
@@ -38,14 +37,6 @@ struct OpenRequest {
     bool enhanced = false;   // "CS Enhanced pitch accuracy" for this run
     bool boost = false;      // "CS Boost speed" for this run
 };
-
-static bool parseSeconds(const std::string& text, double* seconds) {
-    char* after = nullptr;
-    double value = std::strtod(text.c_str(), &after);
-    if (after == text.c_str() || *after != '\0' || !(value >= 0)) return false;
-    *seconds = value;
-    return true;
-}
 
 // Reads the arguments after the command's name; false (after saying why) when they are not
 // understood.
@@ -189,19 +180,9 @@ int runOpenCommand(const std::vector<std::string>& arguments) {
     if (request.pitchRange >= 0) generalSettings.pitchRange = request.pitchRange;
     if (request.enhanced) generalSettings.enhancedPitchAccuracy = true;
     if (request.boost) globalSettings.boostSpeed = true;
-    openWaveFile(request.input);
-    if (!audioActivity.opening) {
-        closeSong();
-        return EXIT_FAILED;   // refused; the message is on stderr
-    }
-    waitForOpeningToEnd();
-    int result = EXIT_FAILED;
-    if (song.blockCount == 0) {
-        std::fprintf(stderr, "melodrift-cli: %s holds less than one block of audio\n", request.input.c_str());
-    } else {
-        printSummary(request);
-        result = writeOutputs(request) ? 0 : EXIT_FAILED;
-    }
+    if (!openSongFromCommandLine(request.input)) return EXIT_FAILED;
+    printSummary(request);
+    int result = writeOutputs(request) ? 0 : EXIT_FAILED;
     closeSong();
     return result;
 }
