@@ -7,6 +7,8 @@
 
 // Playback devices (platform/media.h) through the server's default sink.
 void installPulseMedia();
+// Capture (platform/capture.h) from the server's default source.
+void installPulseCapture();
 
 // What a benchmark reads of the last device played: process clock milliseconds when its play
 // was asked for and when its first samples were handed to the server; 0 until then.
