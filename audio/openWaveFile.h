@@ -47,6 +47,7 @@ struct OpeningState {
     uint32_t startTime;             // time counter when the opening started, hundredths of a second
     int (*quickPreferences)();      // installed by the desktop program: the accuracy/speed preferences before
                                     // opening into an empty song; 1 confirmed, 0 cancelled; null: not offered
+    bool recording;                 // the worker reads a recording from CS.fw rather than a file (recorder)
     SuspendableWorker worker;       // CSOpenWaveFileDataThread; its stop request is the user's stop
 };
 extern OpeningState openingState;
@@ -69,6 +70,13 @@ extern LevelMeter levelMeter;
 // 1 when the path was dealt with (opening started, or refused with a message); 0 when nothing
 // was done (the quick preferences were cancelled).
 int openWaveFile(const std::string& path);
+
+// Shared by opening and recording, holding CSWaveProcessingMutex: a new analysis pass from the
+// song's present end (samples before, start time, analysis tables). 1; 0 when the tables cannot
+// be made (reported).
+int beginSongAnalysis();
+// The worker's counters for a pass over sourcePath (CS.fw when recording), before it starts.
+void prepareSongWorker(const std::string& sourcePath, bool recording);
 
 // The user's stop (the song view): the worker finishes at the next chunk boundary and the
 // song keeps what was analysed. Nothing happens when no opening runs.

@@ -4,6 +4,7 @@
 
 #include "audio/audioActivity.h"
 #include "audio/openWaveFile.h"
+#include "audio/recording.h"
 #include "notes/displayModes.h"
 #include "playback/midiOutput.h"
 #include "playback/playback.h"
@@ -18,6 +19,7 @@ CommandOperations commandOperations = [] {
     CommandOperations operations{};
     operations.openWaveFile = openWaveFile;
     operations.writeNotesMidiFile = saveMidiFile;
+    operations.toggleRecording = startRecording;
     operations.playSong = playSong;
     operations.pausePlayback = pausePlayback;
     return operations;

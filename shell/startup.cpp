@@ -9,6 +9,7 @@
 #include <unistd.h>
 
 #include "analysis/instrumentDefinitions.h"
+#include "audio/recording.h"
 #include "platform/files.h"
 #include "platform/mainloop.h"
 #include "platform/sync.h"
@@ -69,6 +70,9 @@ static void stopEarly() {
     if (appState.hooks.stopGraphics) appState.hooks.stopGraphics();
 }
 
+// The capture notification event, served by the main loop.
+static void serveCaptureEvent() { handleCaptureNotification(); }
+
 int startUp(const StartupOptions& options) {
     appState = AppState{};
     appState.hooks = options.hooks;
@@ -127,7 +131,10 @@ int startUp(const StartupOptions& options) {
     loadInstrumentDefinitions();
     createNamedMutexes();
     emptyUndoFolder();
+    // A recording the last run did not finish is a take the user has sung: it is kept.
+    recoverUnfinishedRecording();
     deleteWorkingFiles();
+    setCaptureEventHandler(serveCaptureEvent);
 
     if (generalSettings.splashScreen && appState.hooks.showSplash) appState.hooks.showSplash();
 
