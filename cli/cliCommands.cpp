@@ -6,6 +6,9 @@
 
 #include "audio/audioActivity.h"
 #include "audio/openWaveFile.h"
+#include "notes/noteList.h"
+#include "platform/files.h"
+#include "platform/ui.h"
 #include "store/song.h"
 #include "store/workingFiles.h"
 
@@ -23,6 +26,9 @@ const std::vector<CliCommand>& cliCommands() {
         {"play", "FILE [--midi] [--from S] [--to E]",
          "open a wave file and play the song (its notes with --midi) through the sound server, S to E seconds", 1,
          runPlayCommand},
+        {"record", "OUT.wav --seconds N [--from-file FILE [--fast]] [--notes-csv FILE] [--midi FILE]",
+         "record N seconds from the default input (or a wave file fed in its place) and save the song and its notes",
+         1, runRecordCommand},
         {"learn-instrument", "[--replace] [--output FILE] FILE...",
          "learn instrument definitions from recordings named with their parameters", 1, runLearnInstrumentCommand},
     };
@@ -54,4 +60,24 @@ int openSongFromCommandLine(const std::string& input) {
     std::fprintf(stderr, "melodrift-cli: %s holds less than one block of audio\n", input.c_str());
     closeSong();
     return 0;
+}
+
+int writeSongNotesCsv(const std::string& path) {
+    FILE* csv = fileOpen(path, "w");
+    if (!csv) {
+        showMessage(MESSAGE_ERROR, "Cannot " + path);
+        return 0;
+    }
+    std::fprintf(csv, "onset_s,offset_s,midi_pitch,pitch_hz,volume_sum\n");
+    for (int i = 0; i < noteList.count; i++) {
+        const Note& n = noteList.notes[i];
+        std::fprintf(csv, "%.4f,%.4f,%u,%.2f,%u\n", double(n.waveStart), double(n.waveEnd), unsigned(n.midiNote),
+                     double(n.pitch), n.volumeSum);
+    }
+    bool failed = std::ferror(csv) != 0;
+    if (fileClose(csv) != 0 || failed) {
+        showMessage(MESSAGE_ERROR, "Cannot " + path);
+        return 0;
+    }
+    return 1;
 }

@@ -91,26 +91,6 @@ static std::string noteName(int midiNote) {
     return std::string(names[midiNote % 12]) + std::to_string(midiNote / 12 - 1);
 }
 
-static int writeNotesTable(const std::string& path) {
-    FILE* csv = fileOpen(path, "w");
-    if (!csv) {
-        showMessage(MESSAGE_ERROR, "Cannot " + path);
-        return 0;
-    }
-    std::fprintf(csv, "onset_s,offset_s,midi_pitch,pitch_hz,volume_sum\n");
-    for (int i = 0; i < noteList.count; i++) {
-        const Note& n = noteList.notes[i];
-        std::fprintf(csv, "%.4f,%.4f,%u,%.2f,%u\n", double(n.waveStart), double(n.waveEnd), unsigned(n.midiNote),
-                     double(n.pitch), n.volumeSum);
-    }
-    bool failed = std::ferror(csv) != 0;
-    if (fileClose(csv) != 0 || failed) {
-        showMessage(MESSAGE_ERROR, "Cannot " + path);
-        return 0;
-    }
-    return 1;
-}
-
 static void printSummary(const OpenRequest& request) {
     const OpeningState& o = openingState;
     std::printf("File: %s\n", request.input.c_str());
@@ -140,7 +120,7 @@ static void printSummary(const OpenRequest& request) {
 static int writeOutputs(const OpenRequest& request) {
     int written = 1;
     if (!request.notesPath.empty()) {
-        if (writeNotesTable(request.notesPath)) std::printf("Notes table: %s\n", request.notesPath.c_str());
+        if (writeSongNotesCsv(request.notesPath)) std::printf("Notes table: %s\n", request.notesPath.c_str());
         else written = 0;
     }
     if (!request.midiPath.empty()) {
