@@ -184,6 +184,8 @@ void prepareSongWorker(const std::string& sourcePath, bool recording) {
     openingProgress.hiresBlocksStored = song.blockCount;
     o.sourcePath = sourcePath;
     o.recording = recording;
+    o.recordedBytes = o.samplesBefore * uint32_t(song.waveFormat.bitsPerSample / 8);
+    o.recordingComplete = false;
 }
 
 void requestOpeningStop() {
@@ -223,6 +225,8 @@ void resetOpeningState() {
     o.displayShare = 0.1;
     o.startTime = 0;
     o.recording = false;
+    o.recordedBytes = 0;
+    o.recordingComplete = false;
     resetOpeningProgress();
     std::lock_guard<std::mutex> guard(levelMeter.lock);
     std::fill(std::begin(levelMeter.levels), std::end(levelMeter.levels), 0);

@@ -23,7 +23,6 @@
 #include "analysis/recognitionOptions.h"
 #include "analysis/spectrogram.h"
 #include "audio/openWaveFile.h"
-#include "audio/recording.h"
 #include "audio/waveWorkingFile.h"
 #include "notes/noteList.h"
 #include "platform/clock.h"
@@ -342,7 +341,7 @@ static void finishOpening() {
         closeFTFile(1);
         closeHiresFTFile(1);
     }
-    if (o.recording) finishRecording();
+    if (o.recording && o.finishRecording) o.finishRecording();
     waitForUndoSnapshotWriter();
     {
         std::lock_guard<std::mutex> access(CSAccessWaveFileMutex);
@@ -351,7 +350,7 @@ static void finishOpening() {
     std::vector<uint8_t>().swap(o.chunkBuffer);
     o.bufferBytes = 0;
     o.bufferSamples = 0;
-    postToMainLoop(o.recording ? recordingEnded : openingEnded);
+    postToMainLoop(o.recording && o.recordingEnded ? o.recordingEnded : openingEnded);
 }
 
 // How far the source reaches, in samples of this pass in whole blocks: the file's length when
@@ -363,8 +362,8 @@ static uint32_t sourceSamples(bool* complete, bool* failed) {
     *failed = false;
     if (o.recording) {
         // The flag before the count: a count read after it includes the last stretch.
-        *complete = recordingState.lastStretchStored;
-        uint32_t stored = recordingState.bytesStored / bytesPerSample();
+        *complete = o.recordingComplete;
+        uint32_t stored = o.recordedBytes / bytesPerSample();
         uint32_t samples = stored > o.samplesBefore ? stored - o.samplesBefore : 0;
         return samples / blockSamples * blockSamples;
     }
@@ -446,7 +445,7 @@ void CSOpenWaveFileDataThread() {
             pushLevelMeterValue(levelMeterValue(o.chunkBuffer.data() + o.bufferBytes - size_t(count) * bps, count,
                                                 song.waveFormat.bitsPerSample));
         int handedOn = cantoscopeWaveformData();
-        if (o.recording) recordingChunkDone(o.samplesDone);
+        if (o.recording && o.recordingChunkDone) o.recordingChunkDone(o.samplesDone);
         processing.unlock();
         p.chunks++;
         if (!handedOn || workerStopRequested(o.worker)) break;

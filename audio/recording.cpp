@@ -22,14 +22,10 @@
 #include "platform/mainloop.h"
 #include "platform/sync.h"
 #include "platform/ui.h"
-#include "playback/playback.h"
-#include "playback/pointerInfo.h"
-#include "playback/songViewGeometry.h"
 #include "shell/mainFrame.h"
 #include "shell/paths.h"
 #include "shell/saveSong.h"
 #include "shell/settings.h"
-#include "shell/startup.h"
 #include "store/fileRoutines.h"
 #include "store/ftBlockStore.h"
 #include "store/hiresFTBlockStore.h"
@@ -38,16 +34,14 @@
 
 RecordingState recordingState;
 
-static const RecordingWindowFunctions* windowFunctions = nullptr;
-
-void setRecordingWindowFunctions(const RecordingWindowFunctions* functions) { windowFunctions = functions; }
+RecordingHooks recordingHooks;
 
 static uint32_t bytesPerSample() { return uint32_t(song.waveFormat.bitsPerSample / 8); }
 
 static void setLabelState(int state) {
     recordingState.labelState = state;
-    pointerInfo.finishing = state == RECORD_LABEL_FINISHING;
-    updateFrameDisplay();
+    if (recordingHooks.stateChanged) recordingHooks.stateChanged();
+    else updateFrameDisplay();
 }
 
 const char* recordLabel() {
@@ -74,7 +68,7 @@ void probeRecordingFormats() {
         RecordingFormat format;
         decodeRecordingFormat(i, &format);
         CaptureFormat capture{format.samplesPerSecond, uint16_t(format.bitsPerSample), uint16_t(format.channels)};
-        recordingState.formatAvailable[i] = appState.directSoundAvailable && captureFormatAvailable(capture);
+        recordingState.formatAvailable[i] = captureObjectCreated() && captureFormatAvailable(capture);
     }
     setWaitCursor(false);
 }
@@ -118,8 +112,8 @@ static void writeRecordingMarker() {
 int startRecording() {
     RecordingState& r = recordingState;
     bool busy = audioActivity.recording || r.stopPending == 1;
-    if (!busy && song.blockCount == 0 && generalSettings.quickPrefs && windowFunctions &&
-        windowFunctions->quickPreferences && !windowFunctions->quickPreferences())
+    if (!busy && song.blockCount == 0 && generalSettings.quickPrefs && recordingHooks.quickPreferences &&
+        !recordingHooks.quickPreferences())
         return 0;
     if (audioActivity.opening) {
         showMessage(MESSAGE_INFORMATION, WHILST_OPENING_TEXT);
@@ -140,12 +134,10 @@ int startRecording() {
         showMessage(MESSAGE_ERROR, RECORDING_DISK_LOW_TEXT);
         return 1;
     }
-    if (!appState.directSoundAvailable) {
+    if (!captureObjectCreated()) {
         showMessage(MESSAGE_ERROR, NO_DIRECTSOUND_TEXT);
         return 1;
     }
-    // What sounds from the speakers would be recorded with the voice.
-    stopPlayback();
     CaptureFormat format;
     if (song.blockCount > 0) {
         format = CaptureFormat{song.waveFormat.samplesPerSec, song.waveFormat.bitsPerSample, 1};
@@ -194,7 +186,6 @@ int startRecording() {
     audioActivity.opening = false;
     r.captureStopped = false;
     r.stopPending = -1;
-    r.lastStretchStored = false;
     r.startTime = timeCounter();
     r.recordedSeconds = 0;
     r.processingLag = 0;
@@ -203,11 +194,13 @@ int startRecording() {
     // the song and is written over.
     song.workingWaveBytes = openingState.samplesBefore * bytesPerSample();
     r.startBytes = song.workingWaveBytes;
-    r.bytesStored = r.startBytes;
     writeRecordingMarker();
 
     showSongView();
     prepareSongWorker(sharedFilePath("CS.fw"), true);
+    openingState.recordingChunkDone = recordingChunkDone;
+    openingState.finishRecording = finishRecording;
+    openingState.recordingEnded = recordingEnded;
     processing.unlock();
     if (startCaptureBuffer() != CAPTURE_OK) showCaptureBufferError();
     setLabelState(RECORD_LABEL_RECORDING);
@@ -223,7 +216,7 @@ static void endCaptureAndDrain() {
     if (captureRunning()) stopCaptureBuffer();
     r.captureStopped = true;
     r.stopPending = 1;
-    r.lastStretchStored = true;
+    openingState.recordingComplete = true;
     setLabelState(RECORD_LABEL_FINISHING);
     resumeWorker(openingState.worker);
 }
@@ -259,7 +252,7 @@ static int storeStretch(const uint8_t* part1, uint32_t bytes1, const uint8_t* pa
         return 0;
     if (!closeReportedFile(file.release())) return 0;
     song.workingWaveBytes = stored + bytes1 + bytes2;
-    recordingState.bytesStored = song.workingWaveBytes;
+    openingState.recordedBytes = song.workingWaveBytes;
     recordingState.recordedSeconds =
         double(song.workingWaveBytes) * 8 / song.waveFormat.bitsPerSample / song.waveFormat.samplesPerSec;
     return 1;
@@ -305,7 +298,7 @@ int handleCaptureNotification() {
 
 int stopRecording() {
     RecordingState& r = recordingState;
-    if (!appState.directSoundAvailable) return 1;
+    if (!captureObjectCreated()) return 1;
     if (r.stopPending == 1) return CSStopCapturingWave();
     r.stopPending = 1;
     if (stopCaptureBuffer() != CAPTURE_OK) showCaptureBufferError();
@@ -314,7 +307,7 @@ int stopRecording() {
     // The stretch captured since the last notification goes into CS.fw before the worker is
     // told that nothing more comes.
     handleCaptureNotification();
-    r.lastStretchStored = true;
+    openingState.recordingComplete = true;
     resumeWorker(openingState.worker);
     return 0;
 }
@@ -323,7 +316,7 @@ int CSStopCapturingWave() {
     RecordingState& r = recordingState;
     if (captureRunning() && stopCaptureBuffer() != CAPTURE_OK) showCaptureBufferError();
     r.captureStopped = true;
-    r.lastStretchStored = true;
+    openingState.recordingComplete = true;
     // The worker finishes at its next chunk boundary and finalises the recording there.
     requestWorkerStop(openingState.worker);
     return 0;
@@ -331,14 +324,14 @@ int CSStopCapturingWave() {
 
 void recordingChunkDone(uint32_t samplesAnalysed) {
     RecordingState& r = recordingState;
-    uint32_t stored = r.bytesStored / std::max(1u, bytesPerSample());
+    uint32_t stored = openingState.recordedBytes / std::max(1u, bytesPerSample());
     double lag = stored > samplesAnalysed ? double(stored - samplesAnalysed) / analysisGeometry.sampleRate : 0.0;
     r.processingLag = lag;
     if (!globalSettings.showSpeedWarning || r.speedWarningShown || lag < SPEED_WARNING_LAG) return;
     if (globalSettings.boostSpeed && globalSettings.inputWaveQuality == 8) return;
     r.speedWarningShown = true;
     postToMainLoop([] {
-        if (windowFunctions && windowFunctions->showSpeedWarning) windowFunctions->showSpeedWarning();
+        if (recordingHooks.showSpeedWarning) recordingHooks.showSpeedWarning();
     });
 }
 
@@ -349,11 +342,9 @@ void recordingEnded() {
     audioActivity.recording = false;
     audioActivity.opening = false;
     r.stopPending = -1;
-    r.lastStretchStored = false;
     r.processingLag = 0;
     fileDelete(markerPath());
     setLabelState(RECORD_LABEL_IDLE);
-    scrollToSongEnd();
     redrawSongView();
 }
 
@@ -369,6 +360,8 @@ void finishRecording() {
         recordingState.recordedSeconds = double(frames) / std::max(1u, song.waveFormat.samplesPerSec);
     }
 }
+
+uint32_t recordedBytesStored() { return openingState.recordedBytes; }
 
 void maximizeRecordingSpeed() {
     globalSettings.boostSpeed = true;
@@ -438,15 +431,12 @@ void resetRecordingState() {
     r.captureFormat = CaptureFormat{};
     std::fill(std::begin(r.formatAvailable), std::end(r.formatAvailable), false);
     r.notificationSize = r.bufferSize = r.nextCaptureOffset = r.startBytes = 0;
-    r.bytesStored = 0;
     r.recordedSeconds = 0;
     r.captureStopped = false;
     r.stopPending = -1;
-    r.lastStretchStored = false;
     r.lastRecordPress = 0;
     r.processingLag = 0;
     r.speedWarningShown = false;
     r.startTime = 0;
     r.labelState = RECORD_LABEL_IDLE;
-    pointerInfo.finishing = false;
 }

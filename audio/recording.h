@@ -57,11 +57,9 @@ struct RecordingState {
     uint32_t bufferSize = 0;                    // 16 N
     uint32_t nextCaptureOffset = 0;             // where the next stretch is taken from the capture buffer
     uint32_t startBytes = 0;                    // CS.fw's data bytes when this recording started
-    std::atomic<uint32_t> bytesStored{0};       // CS.fw's data bytes now (the handler; read by the worker)
     double recordedSeconds = 0;                 // CS.fw's audio, seconds
     std::atomic<bool> captureStopped{false};    // the capture buffer has been stopped
     std::atomic<int> stopPending{-1};           // 1 from the user's stop until the worker has drained; else -1
-    std::atomic<bool> lastStretchStored{false}; // after the stop, the last captured stretch is in CS.fw
     uint32_t lastRecordPress = 0;               // time counter at the last Record press acted on
     std::atomic<double> processingLag{0.0};     // seconds captured but not analysed (worker)
     bool speedWarningShown = false;             // the information box came in this recording
@@ -70,14 +68,16 @@ struct RecordingState {
 };
 extern RecordingState recordingState;
 
-// What the desktop program shows for the recorder. A null entry is left out.
-struct RecordingWindowFunctions {
-    // The recording preferences before recording into an empty song; 1 to go on, 0 cancelled.
+// What the layers above show of the recorder. A null entry is left out.
+struct RecordingHooks {
+    // The recording preferences before recording into an empty song; 1 to go on, 0 cancelled (desktop program).
     int (*quickPreferences)();
-    // Dialog 1132, "Information for Recording in Real-Time", not modal; called on the main thread.
+    // Dialog 1132, "Information for Recording in Real-Time", not modal; on the main thread (desktop program).
     void (*showSpeedWarning)();
+    // The Record label changed (recording, finishing, ended): the song's window follows (shell).
+    void (*stateChanged)();
 };
-void setRecordingWindowFunctions(const RecordingWindowFunctions* functions);
+extern RecordingHooks recordingHooks;
 
 // Record: starts a recording, or stops the one that runs. 0 started or nothing to do; 1
 // refused (after its message).
@@ -92,18 +92,21 @@ int handleCaptureNotification();
 // Stops the capture and has the worker finish the recording now: what is in CS.fw is analysed
 // and kept. Called on any capture failure and when a finishing recording is pressed again. 0.
 int CSStopCapturingWave();
-// Fills formatAvailable from the capture object (all clear without one), with the wait cursor.
+// Fills formatAvailable from the capture object (all clear without one: DirectSound is not
+// available), with the wait cursor.
 void probeRecordingFormats();
 // The capture format of a quality index: mono PCM of its rate and bits.
 CaptureFormat captureFormatOfQuality(int index);
 
-// Called by the worker as it finishes a recording: finalises CS.fw for the song's length
-// (header, exact length). It then posts recordingEnded, which ends the recording on the main
-// thread (flags, labels, the capture buffer, the view).
+// The worker's part of a recording (installed in the opening state by startRecording): after
+// each chunk the processing lag and the information box when due; as it finishes, CS.fw
+// finalised for the song's length (header, exact length); and, posted as its last act, the
+// recording's end on the main thread (flags, labels, the capture buffer, the view).
+void recordingChunkDone(uint32_t samplesAnalysed);
 void finishRecording();
 void recordingEnded();
-// The worker's note after each chunk: the processing lag, and the information box when due.
-void recordingChunkDone(uint32_t samplesAnalysed);
+// CS.fw's data bytes stored so far in this recording (read by the worker as it analyses).
+uint32_t recordedBytesStored();
 
 // The label the Record command shows: "&Record Audio...", "&Stop Recording" or "Finishing...".
 const char* recordLabel();

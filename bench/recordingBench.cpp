@@ -40,7 +40,7 @@ static BenchRun run;
 
 static double secondsCaptured() {
     uint32_t byteRate = song.waveFormat.samplesPerSec * (song.waveFormat.bitsPerSample / 8);
-    return byteRate ? double(recordingState.bytesStored - recordingState.startBytes) / byteRate : 0.0;
+    return byteRate ? double(recordedBytesStored() - recordingState.startBytes) / byteRate : 0.0;
 }
 
 int main(int argc, char** argv) {

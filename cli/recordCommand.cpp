@@ -66,7 +66,7 @@ static bool parseRecordRequest(const std::vector<std::string>& arguments, Record
 
 static double secondsRecorded() {
     uint32_t byteRate = song.waveFormat.samplesPerSec * (song.waveFormat.bitsPerSample / 8);
-    uint32_t bytes = recordingState.bytesStored - recordingState.startBytes;
+    uint32_t bytes = recordedBytesStored() - recordingState.startBytes;
     return byteRate ? double(bytes) / byteRate : 0.0;
 }
 

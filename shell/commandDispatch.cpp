@@ -63,6 +63,8 @@ static void recordCommand() {
         reportNotAvailable(CMD_RECORD);
         return;
     }
+    // What sounds from the speakers would be recorded with the voice.
+    if (!audioActivity.recording) stopPlayback();
     commandOperations.toggleRecording();
 }
 

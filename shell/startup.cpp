@@ -20,6 +20,7 @@
 #include "shell/openQueue.h"
 #include "shell/paths.h"
 #include "shell/quitFlag.h"
+#include "shell/recordingView.h"
 #include "shell/saveSong.h"
 #include "shell/settings.h"
 #include "store/fileRoutines.h"
@@ -135,6 +136,7 @@ int startUp(const StartupOptions& options) {
     recoverUnfinishedRecording();
     deleteWorkingFiles();
     setCaptureEventHandler(serveCaptureEvent);
+    recordingHooks.stateChanged = recordingStateChanged;
 
     if (generalSettings.splashScreen && appState.hooks.showSplash) appState.hooks.showSplash();
 

@@ -25,6 +25,7 @@
 #include "platform/ui.h"
 #include "playback/pointerInfo.h"
 #include "shell/paths.h"
+#include "shell/recordingView.h"
 #include "shell/settings.h"
 #include "shell/startup.h"
 #include "store/song.h"
@@ -50,7 +51,7 @@ std::vector<int16_t> samplesOf(const std::vector<uint8_t>& bytes, size_t from = 
 }
 
 int speedWarnings = 0;
-const RecordingWindowFunctions countingWindows = {nullptr, [] { speedWarnings++; }};
+
 
 class Recording : public ::testing::Test {
 protected:
@@ -64,6 +65,7 @@ protected:
     }
     void TearDown() override {
         clean();
+        recordingHooks = RecordingHooks{};
         setCaptureEventHandler(nullptr);
         setManualClock(false);
         paths = savedPaths;
@@ -81,7 +83,7 @@ protected:
         setCaptureBackend(nullptr);
         releaseCaptureObject();
         appState.directSoundAvailable = false;
-        setRecordingWindowFunctions(nullptr);
+        recordingHooks = RecordingHooks{nullptr, nullptr, recordingStateChanged};
         setFreeDiskSpaceOverride(int64_t(1) << 40);
         audioActivity = AudioActivity{};
         clearUiCalls();
@@ -97,7 +99,7 @@ protected:
         appState.directSoundAvailable = createCaptureObject();
     }
     double secondsStored() {
-        return double(recordingState.bytesStored - recordingState.startBytes) / (song.waveFormat.samplesPerSec * 2.0);
+        return double(recordedBytesStored() - recordingState.startBytes) / (song.waveFormat.samplesPerSec * 2.0);
     }
     // Serves the main loop until pred holds (or ten seconds of real time have passed).
     template <class Pred> bool serveUntil(Pred pred) {
@@ -278,10 +280,10 @@ TEST_F(Recording, RefusalsLeaveTheSongAsItWas) {
 }
 
 TEST_F(Recording, TheInformationBoxComesOnceWhenTheAnalysisFallsFiveSecondsBehind) {
-    setRecordingWindowFunctions(&countingWindows);
+    recordingHooks.showSpeedWarning = [] { speedWarnings++; };
     song.waveFormat = SongWaveFormat{1, 1, RATE, RATE * 2, 2, 16};
     analysisGeometry.sampleRate = RATE;
-    recordingState.bytesStored = 10 * RATE * 2;
+    openingState.recordedBytes = 10 * RATE * 2;
     recordingChunkDone(uint32_t(5.5 * RATE));   // 4.5 s behind
     serveMainLoopOnce();
     EXPECT_EQ(speedWarnings, 0);
