@@ -9,6 +9,8 @@
 void installPulseMedia();
 // Capture (platform/capture.h) from the server's default source.
 void installPulseCapture();
+// The mixer (platform/mixer.h): the server's sources, the default one and its volume.
+void installPulseMixer();
 
 // What a benchmark reads of the last device played: process clock milliseconds when its play
 // was asked for and when its first samples were handed to the server; 0 until then.
