@@ -109,6 +109,65 @@ static void writeRecordingMarker() {
     if (FILE* marker = fileOpen(markerPath(), "wb")) fileClose(marker);
 }
 
+// The level monitor's stretches: a twentieth of a second.
+static const uint32_t MONITOR_STRETCHES_PER_SECOND = 20;
+
+int startLevelMonitor() {
+    RecordingState& r = recordingState;
+    if (r.monitoring) return 1;
+    if (audioActivity.recording || !captureObjectCreated()) return 0;
+    CaptureFormat format = song.blockCount > 0
+                               ? CaptureFormat{song.waveFormat.samplesPerSec, song.waveFormat.bitsPerSample, 1}
+                               : captureFormatOfQuality(globalSettings.inputWaveQuality);
+    r.notificationSize = format.rate / MONITOR_STRETCHES_PER_SECOND * (format.bits / 8);
+    r.bufferSize = CAPTURE_NOTIFICATION_POSITIONS * r.notificationSize;
+    if (r.notificationSize == 0 || createCaptureBuffer(format, r.bufferSize) != CAPTURE_OK) return 0;
+    uint32_t positions[CAPTURE_NOTIFICATION_POSITIONS];
+    for (int i = 0; i < CAPTURE_NOTIFICATION_POSITIONS; i++) positions[i] = uint32_t(i + 1) * r.notificationSize - 1;
+    setCaptureNotificationPositions(positions, CAPTURE_NOTIFICATION_POSITIONS);
+    r.captureFormat = format;
+    r.nextCaptureOffset = 0;
+    if (startCaptureBuffer() != CAPTURE_OK) {
+        releaseCaptureBuffer();
+        return 0;
+    }
+    r.monitoring = true;
+    return 1;
+}
+
+void stopLevelMonitor() {
+    RecordingState& r = recordingState;
+    if (!r.monitoring) return;
+    r.monitoring = false;
+    releaseCaptureBuffer();
+}
+
+bool levelMonitorRunning() { return recordingState.monitoring; }
+
+// A stretch captured for the monitor: its level, and nothing kept.
+static int showMonitoredLevel() {
+    RecordingState& r = recordingState;
+    uint32_t position = 0;
+    if (captureReadPosition(&position) != CAPTURE_OK) {
+        stopLevelMonitor();
+        return 1;
+    }
+    uint32_t size = (position + r.bufferSize - r.nextCaptureOffset) % r.bufferSize;
+    uint32_t sampleBytes = r.captureFormat.bits / 8;
+    size -= size % sampleBytes;
+    if (size == 0) return 0;
+    const uint8_t *part1, *part2;
+    uint32_t bytes1, bytes2;
+    if (lockCaptureBuffer(r.nextCaptureOffset, size, &part1, &bytes1, &part2, &bytes2) != CAPTURE_OK) return 1;
+    std::vector<uint8_t> both(part1, part1 + bytes1);
+    if (part2) both.insert(both.end(), part2, part2 + bytes2);
+    unlockCaptureBuffer();
+    pushLevelMeterValue(levelMeterValue(both.data(), size / sampleBytes, r.captureFormat.bits));
+    r.nextCaptureOffset = (r.nextCaptureOffset + size) % r.bufferSize;
+    if (recordingHooks.levelChanged) recordingHooks.levelChanged();
+    return 0;
+}
+
 int startRecording() {
     RecordingState& r = recordingState;
     bool busy = audioActivity.recording || r.stopPending == 1;
@@ -157,6 +216,7 @@ int startRecording() {
         return 1;
     }
 
+    stopLevelMonitor();
     std::unique_lock<std::mutex> processing(CSWaveProcessingMutex);
     bool appending = song.blockCount > 0;
     if (!beginSongAnalysis() || !makeCaptureBuffer(format)) {
@@ -260,6 +320,7 @@ static int storeStretch(const uint8_t* part1, uint32_t bytes1, const uint8_t* pa
 
 int handleCaptureNotification() {
     RecordingState& r = recordingState;
+    if (r.monitoring) return showMonitoredLevel();
     if (!captureBufferCreated() || !analysisBuffersReady() || !audioActivity.recording) return 1;
     uint32_t position = 0;
     if (captureReadPosition(&position) != CAPTURE_OK) {
@@ -426,6 +487,7 @@ std::string recoverUnfinishedRecording() {
 }
 
 void resetRecordingState() {
+    stopLevelMonitor();
     releaseCaptureBuffer();
     RecordingState& r = recordingState;
     r.captureFormat = CaptureFormat{};

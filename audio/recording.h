@@ -65,6 +65,7 @@ struct RecordingState {
     bool speedWarningShown = false;             // the information box came in this recording
     uint32_t startTime = 0;                     // time counter at the start
     int labelState = RECORD_LABEL_IDLE;         // RecordLabelState
+    bool monitoring = false;                    // the capture runs only to show the input's level
 };
 extern RecordingState recordingState;
 
@@ -76,6 +77,8 @@ struct RecordingHooks {
     void (*showSpeedWarning)();
     // The Record label changed (recording, finishing, ended): the song's window follows (shell).
     void (*stateChanged)();
+    // The level monitor put a new level in the meter's history: the meter shows it (desktop program).
+    void (*levelChanged)();
 };
 extern RecordingHooks recordingHooks;
 
@@ -107,6 +110,13 @@ void finishRecording();
 void recordingEnded();
 // CS.fw's data bytes stored so far in this recording (read by the worker as it analyses).
 uint32_t recordedBytesStored();
+
+// The input's level on the meter before a recording: the capture runs without storing
+// anything, and each stretch only moves the meter. The song's format when it holds audio, else
+// the chosen quality's. 1 when it runs; 0 without an input. A recording stops it.
+int startLevelMonitor();
+void stopLevelMonitor();
+bool levelMonitorRunning();
 
 // The label the Record command shows: "&Record Audio...", "&Stop Recording" or "Finishing...".
 const char* recordLabel();

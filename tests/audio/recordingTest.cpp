@@ -83,7 +83,7 @@ protected:
         setCaptureBackend(nullptr);
         releaseCaptureObject();
         appState.directSoundAvailable = false;
-        recordingHooks = RecordingHooks{nullptr, nullptr, recordingStateChanged};
+        recordingHooks = RecordingHooks{nullptr, nullptr, recordingStateChanged, nullptr};
         setFreeDiskSpaceOverride(int64_t(1) << 40);
         audioActivity = AudioActivity{};
         clearUiCalls();
@@ -342,4 +342,24 @@ TEST_F(Recording, ARecordingThatWasNeverFinishedIsKeptAtTheNextStart) {
     EXPECT_FALSE(fileExists(sharedFilePath(RECORDING_MARKER_FILE)));
     EXPECT_NE(lastMessageText().find(kept), std::string::npos);
     fileDelete(kept);
+}
+
+TEST_F(Recording, BeforeARecordingTheMeterShowsTheInputWithoutKeepingAnything) {
+    useFeeder(writeMelody("melody.wav", 3.0));
+    ASSERT_EQ(startLevelMonitor(), 1);
+    auto levelsShown = [] {
+        std::lock_guard<std::mutex> guard(levelMeter.lock);
+        return std::count_if(std::begin(levelMeter.levels), std::end(levelMeter.levels), [](int v) { return v > 0; });
+    };
+    ASSERT_TRUE(serveUntil([&] { return levelsShown() >= 10; }));
+    EXPECT_EQ(song.blockCount, 0u);
+    EXPECT_FALSE(fileExists(sharedFilePath("CS.fw")));
+    EXPECT_FALSE(audioActivity.recording);
+    // Record takes the input over from the monitor.
+    ASSERT_EQ(startRecording(), 0);
+    EXPECT_FALSE(levelMonitorRunning());
+    EXPECT_TRUE(audioActivity.recording);
+    advanceManualClock(1000);
+    startRecording();
+    ASSERT_TRUE(serveUntil([] { return !audioActivity.recording; }));
 }
