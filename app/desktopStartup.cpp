@@ -14,7 +14,9 @@
 #include "app/mainFrame.h"
 #include "app/splash.h"
 #include "platform/mainloop.h"
+#include "platform/capture.h"
 #include "platform/media.h"
+#include "platform/mixer.h"
 #include "platform/pulse/pulseBackends.h"
 #include "platform/qt/qtMainLoop.h"
 #include "platform/qt/qtUi.h"
@@ -83,6 +85,17 @@ StartupHooks desktopStartupHooks(int* argc, char** argv) {
     hooks.createMainFrame = createMainFrame;
     hooks.destroyMainFrame = destroyMainFrame;
     hooks.showSplash = showSplashScreen;
+    // The input to record from: the sound server's default source, with its mixer.
+    hooks.createCaptureObject = [] {
+        installPulseCapture();
+        installPulseMixer();
+        return createCaptureObject();
+    };
+    hooks.releaseCaptureObject = [] {
+        releaseCaptureObject();
+        setCaptureBackend(nullptr);
+        setMixerBackend(nullptr);
+    };
     hooks.updateMenus = updateMenus;
     return hooks;
 }

@@ -16,6 +16,9 @@
 
 #include "analysis/pitchScale.h"
 #include "audio/audioActivity.h"
+#include "audio/audioActivity.h"
+#include "audio/openWaveWorker.h"
+#include "audio/recording.h"
 #include "notes/displayModes.h"
 #include "notes/noteList.h"
 #include "notes/selection.h"
@@ -272,6 +275,10 @@ void paintInfoStrip(Painting& p) {
     }
     drawStripText(p, INFO_PITCH_X, baseline, true, p.c.stripText, QString::fromStdString(info.pitchName));
     drawStripText(p, INFO_FREQUENCY_X, baseline, false, p.c.stripText, QString::fromStdString(info.frequencyText));
+    if (audioActivity.recording)
+        drawStripText(p, INFO_LOAD_X, baseline, false, p.c.stripText,
+                      QString::fromStdString(recordingLoadText(recordingState.processingLag,
+                                                               openingProgress.processingLoad * 100.0)));
 
     int segments = tuningDeviationSegments(info.tuningFrequency, info.tuningKey);
     int segmentTop = top + (PLOT_BOTTOM_MARGIN - TUNING_SEGMENT_HEIGHT) / 2;

@@ -10,6 +10,8 @@
 #include "app/levelMeter.h"
 #include "app/mainFrame.h"
 #include "app/songView.h"
+#include "audio/audioActivity.h"
+#include "audio/recordingSource.h"
 #include "notes/displayModes.h"
 #include "playback/playback.h"
 #include "playback/pointerInfo.h"
@@ -88,7 +90,18 @@ void SongWindow::refresh() {
     showModeButtons(buttons[0], buttons[1], buttons[2]);
     buttons[3]->setText(playButtonLabel());
     view->songChanged();
+    // A recording that starts names its source and level on the meter.
+    if (audioActivity.recording && !wasRecording) refreshMeterCaption();
+    wasRecording = audioActivity.recording;
     if (meter) meter->update();
+}
+
+void SongWindow::refreshMeter() {
+    if (meter) meter->update();
+}
+
+void SongWindow::refreshMeterCaption() {
+    if (meter && meter->isVisible()) meter->setWindowTitle(QString::fromStdString(meterLevelText()));
 }
 
 void SongWindow::closeEvent(QCloseEvent* event) {

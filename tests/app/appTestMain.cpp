@@ -15,6 +15,7 @@ int runMainFrameTests(int argc, char** argv);
 int runQtPlatformTests(int argc, char** argv);
 int runDesktopStartupTests(int argc, char** argv);
 int runSongViewTests(int argc, char** argv);
+int runPreferencesDialogTests(int argc, char** argv);
 
 int main(int argc, char** argv) {
     if (qEnvironmentVariableIsEmpty("QT_QPA_PLATFORM")) qputenv("QT_QPA_PLATFORM", "offscreen");
@@ -35,5 +36,6 @@ int main(int argc, char** argv) {
     failures += runQtPlatformTests(argc, argv) != 0;
     failures += runDesktopStartupTests(argc, argv) != 0;
     failures += runSongViewTests(argc, argv) != 0;
+    failures += runPreferencesDialogTests(argc, argv) != 0;
     return failures;
 }
