@@ -184,27 +184,10 @@ static int appendToWorkingFile() {
     }
     if (o.samplesDone == o.storedSamples) return 1;
     uint32_t bps = bytesPerSample();
-    std::string path = sharedFilePath("CS.fw");
-    waitForUndoSnapshotWriter();
-    std::lock_guard<std::mutex> access(CSAccessWaveFileMutex);
-    unmaskWaveWorkingFile();
-    WaveReadInfo layout{};
-    if (wioFileOpen(&layout, path, 0) != WIO_OPENED) {
-        showMessage(MESSAGE_ERROR, HAND_ON_OPEN_TEXT_1);
-        return 0;
-    }
-    wioFileClose(&layout);
-    auto closeFile = [](FILE* f) { fileClose(f); };
-    std::unique_ptr<FILE, decltype(closeFile)> file(openReportedFile(path, "r+b"), closeFile);
-    if (!file) return 0;
     const uint8_t* samples = o.chunkBuffer.data() + size_t(int64_t(o.storedSamples) - o.bufferFirstSample) * bps;
     size_t bytes = size_t(o.samplesDone - o.storedSamples) * bps;
     uint32_t dataBytes = o.samplesDone * bps;
-    if (!seekReportedFile(file.get(), int64_t(layout.dataOffset) + int64_t(o.storedSamples) * bps) ||
-        !writeReportedBytes(file.get(), samples, bytes) ||
-        !patchWaveHeader(file.get(), layout, dataBytes, song.waveFormat.bitsPerSample))
-        return 0;
-    if (!closeReportedFile(file.release())) return 0;
+    if (!appendToWaveWorkingFile(o.storedSamples * bps, samples, bytes, HAND_ON_OPEN_TEXT_1)) return 0;
     o.storedSamples = o.samplesDone;
     song.workingWaveBytes = dataBytes;
     openingProgress.recordedSeconds = double(dataBytes) * 8 / song.waveFormat.bitsPerSample / analysisGeometry.sampleRate;

@@ -292,26 +292,11 @@ static void pushStretchLevel(const uint8_t* part1, uint32_t bytes1, const uint8_
 // Appends the stretch to CS.fw after the bytes it holds and patches its header. 1; 0 after a
 // message.
 static int storeStretch(const uint8_t* part1, uint32_t bytes1, const uint8_t* part2, uint32_t bytes2) {
-    std::string path = sharedFilePath("CS.fw");
-    waitForUndoSnapshotWriter();
-    std::lock_guard<std::mutex> access(CSAccessWaveFileMutex);
-    unmaskWaveWorkingFile();
-    WaveReadInfo layout{};
-    if (wioFileOpen(&layout, path, 0) != WIO_OPENED) {
-        showMessage(MESSAGE_ERROR, HANDLER_OPEN_TEXT);
-        return 0;
-    }
-    wioFileClose(&layout);
-    auto closeFile = [](FILE* f) { fileClose(f); };
-    std::unique_ptr<FILE, decltype(closeFile)> file(openReportedFile(path, "r+b"), closeFile);
-    if (!file) return 0;
     uint32_t stored = song.workingWaveBytes;
-    if (!seekReportedFile(file.get(), int64_t(layout.dataOffset) + stored) ||
-        !writeReportedBytes(file.get(), part1, bytes1) || (part2 && !writeReportedBytes(file.get(), part2, bytes2)) ||
-        !patchWaveHeader(file.get(), layout, stored + bytes1 + bytes2, song.waveFormat.bitsPerSample))
-        return 0;
-    if (!closeReportedFile(file.release())) return 0;
-    song.workingWaveBytes = stored + bytes1 + bytes2;
+    std::vector<uint8_t> stretch(part1, part1 + bytes1);
+    if (part2) stretch.insert(stretch.end(), part2, part2 + bytes2);
+    if (!appendToWaveWorkingFile(stored, stretch.data(), stretch.size(), HANDLER_OPEN_TEXT)) return 0;
+    song.workingWaveBytes = stored + uint32_t(stretch.size());
     openingState.recordedBytes = song.workingWaveBytes;
     recordingState.recordedSeconds =
         double(song.workingWaveBytes) * 8 / song.waveFormat.bitsPerSample / song.waveFormat.samplesPerSec;

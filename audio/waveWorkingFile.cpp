@@ -12,6 +12,7 @@
 #include "audio/audioActivity.h"
 #include "platform/files.h"
 #include "platform/sync.h"
+#include "platform/ui.h"
 #include "shell/paths.h"
 #include "store/fileRoutines.h"
 #include "store/song.h"
@@ -139,6 +140,26 @@ int patchWaveHeader(FILE* file, const WaveReadInfo& layout, uint32_t dataBytes, 
     putLittle32(value, uint32_t(std::min<uint64_t>(riffSize, 0xFFFFFFFFu)));
     if (!seekReportedFile(file, 4) || !writeReportedBytes(file, value, 4)) return 0;
     return 1;
+}
+
+int appendToWaveWorkingFile(uint32_t storedBytes, const uint8_t* samples, size_t count, const char* openFailureText) {
+    std::string path = workingWavePath();
+    waitForUndoSnapshotWriter();
+    std::lock_guard<std::mutex> access(CSAccessWaveFileMutex);
+    unmaskWaveWorkingFile();
+    WaveReadInfo layout{};
+    if (wioFileOpen(&layout, path, 0) != WIO_OPENED) {
+        showMessage(MESSAGE_ERROR, openFailureText);
+        return 0;
+    }
+    wioFileClose(&layout);
+    StreamGuard file(openReportedFile(path, "r+b"));
+    if (!file) return 0;
+    if (!seekReportedFile(file.get(), int64_t(layout.dataOffset) + storedBytes) ||
+        !writeReportedBytes(file.get(), samples, count) ||
+        !patchWaveHeader(file.get(), layout, uint32_t(storedBytes + count), song.waveFormat.bitsPerSample))
+        return 0;
+    return closeReportedFile(file.release());
 }
 
 int finaliseWaveWorkingFile() {
