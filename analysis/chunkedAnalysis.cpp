@@ -7,8 +7,6 @@
 #include <algorithm>
 #include <cmath>
 #include <ctime>
-#include <new>
-#include <stdexcept>
 #include <vector>
 
 #include "analysis/analysisGeometry.h"
@@ -17,6 +15,7 @@
 #include "analysis/frequencyTable.h"
 #include "analysis/recognitionOptions.h"
 #include "analysis/spectrogram.h"
+#include "platform/allocation.h"
 #include "platform/ui.h"
 #include "resources/strings.h"
 #include "store/ftBlockStore.h"
@@ -56,9 +55,7 @@ int analyseSource(AnalysisSampleSource source, void* sourceContext, AnalysisChun
     while (true) {
         if (endOfSong < 0) {
             size_t had = held.size();
-            try {
-                held.resize(had + size_t(chunk) * bytesPerSample);
-            } catch (const std::bad_alloc&) {
+            if (!tryResize(held, had + size_t(chunk) * bytesPerSample)) {
                 showMessage(MESSAGE_ERROR, resourceString(10401));
                 return 0;
             }

@@ -3,15 +3,13 @@
 #include "analysis/frequencyAnalysis.h"
 
 #include <algorithm>
-#include <atomic>
 #include <cmath>
-#include <new>
-#include <stdexcept>
 
 #include "analysis/analysisSampleBuffer.h"
 #include "analysis/spectrogram.h"
 #include "analysis/vector/window.h"
 #include "analysis/weightTables.h"
+#include "platform/allocation.h"
 #include "platform/ui.h"
 #include "resources/strings.h"
 #include "store/ftBlockStore.h"
@@ -19,18 +17,6 @@
 #include "store/song.h"
 
 FrequencyAnalysisState frequencyAnalysis;
-
-static std::atomic<int> allocationFailAt{0};   // allocations left until the injected failure; 0 = none
-
-void failAnalysisAllocation(int n) { allocationFailAt = n > 0 ? n : 0; }
-
-static bool allocationRefused() {
-    int left = allocationFailAt.load();
-    while (left > 0) {
-        if (allocationFailAt.compare_exchange_weak(left, left - 1)) return left == 1;
-    }
-    return false;
-}
 
 template <class T>
 static void release(std::vector<T>& v) {
@@ -64,18 +50,10 @@ void releaseFrequencyAnalysis() {
 
 int analysisBuffersReady() { return frequencyAnalysis.ready ? 1 : 0; }
 
-// Sizes one working buffer; false when the memory cannot be had (or a test refuses it).
+// Sizes one working buffer, all of it zero; false when the memory cannot be had.
 template <class T>
 static bool allocate(std::vector<T>& v, size_t count) {
-    try {
-        if (allocationRefused()) throw std::bad_alloc();
-        v.assign(count, T{});
-    } catch (const std::bad_alloc&) {
-        return false;
-    } catch (const std::length_error&) {
-        return false;
-    }
-    return true;
+    return tryAllocate([&] { v.assign(count, T{}); });
 }
 
 static bool allocateWorkingBuffers(const AnalysisGeometry& g) {

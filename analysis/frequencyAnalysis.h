@@ -75,6 +75,3 @@ int analysisBuffersReady();
 // summed power.
 double analyseResolutionLevel(uint32_t n, double* powerOut, dComplex* phaseOut, uint32_t firstFrame,
                               uint32_t endFrame, int level);
-
-// Tests: the nth working-buffer allocation of setup from now fails (1 = the next); 0 = off.
-void failAnalysisAllocation(int n);

@@ -9,8 +9,8 @@
 #include <cmath>
 #include <cstring>
 #include <memory>
-#include <new>
 
+#include "platform/allocation.h"
 #include "platform/files.h"
 #include "platform/ui.h"
 #include "resources/strings.h"
@@ -28,15 +28,6 @@ static const char* const CHORD_LIMIT_TEXT =
 
 // Bytes of a definition's fixed part: three names, voice, chord limit, thresholds, middle A, range.
 static const size_t DEFINITION_HEAD_BYTES = 3 * 2 * INSTRUMENT_NAME_UNITS + 2 + 3 * 4 + 4 + 2;
-
-static int allocationFailAt = 0;   // tests: the nth loader allocation from now fails
-
-void failInstrumentAllocation(int n) { allocationFailAt = n; }
-
-static bool allocationFails() {
-    if (allocationFailAt <= 0) return false;
-    return --allocationFailAt == 0;
-}
 
 std::string instrumentDefinitionsPath() {
     const std::string& path = instrumentDefinitions.filePath;
@@ -227,10 +218,7 @@ static bool readDefinition(InstrumentFileReader& r, InstrumentDefinition& d) {
     if (d.lowSemitone > d.highSemitone) return r.refuse("a semitone range has its low note above its high note");
     if (d.highSemitone > MAX_CS_SEMITONE) return r.refuse("a semitone range goes beyond note 127");
     size_t semitones = size_t(d.highSemitone - d.lowSemitone) + 1;
-    try {
-        if (allocationFails()) throw std::bad_alloc();
-        d.semitones.assign(semitones, NoteSampleSet{});
-    } catch (const std::bad_alloc&) {
+    if (!tryAllocate([&] { d.semitones.assign(semitones, NoteSampleSet{}); })) {
         r.outOfMemory = 1;
         return r.refuse("out of memory");
     }
@@ -263,14 +251,9 @@ int loadInstrumentDefinitions() {
     uint32_t count = 0;
     if (r.read(&count, 4) && count > uint32_t(MAX_CS_INSTRUMENTS)) r.refuse("it holds more than 256 definitions");
     std::vector<InstrumentDefinition> definitions;
-    if (!r.reason) {
-        try {
-            if (allocationFails()) throw std::bad_alloc();
-            definitions.resize(count);
-        } catch (const std::bad_alloc&) {
-            r.outOfMemory = 1;
-            r.refuse("out of memory");
-        }
+    if (!r.reason && !tryResize(definitions, count)) {
+        r.outOfMemory = 1;
+        r.refuse("out of memory");
     }
     for (uint32_t i = 0; i < count && !r.reason; i++) readDefinition(r, definitions[i]);
     uint8_t extra;

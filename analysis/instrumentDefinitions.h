@@ -135,6 +135,3 @@ float nearestNoteFrequency(double frequency, double middleA);
 // chord is %d. Middle A is %.2fHz. Semitone range is %d to %d. Score thresholds: %.1f%%,
 // %.1f%%, %.1f%%." with a "." as decimal point whatever the locale.
 std::string instrumentDefinitionText(const InstrumentDefinition& definition);
-
-// Tests: the nth allocation of the loader from now fails (1 = the next); 0 switches it off.
-void failInstrumentAllocation(int n);

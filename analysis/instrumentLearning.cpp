@@ -18,6 +18,7 @@
 #include "analysis/recognitionOptions.h"
 #include "audio/waveFile.h"
 #include "audio/waveWorkingFile.h"
+#include "platform/allocation.h"
 #include "platform/files.h"
 #include "platform/ui.h"
 #include "resources/generalMidi.h"
@@ -390,9 +391,9 @@ struct BlockCollector {
 static int collectBlocks(void* context, uint32_t firstBlock, uint32_t endBlock) {
     BlockCollector& c = *static_cast<BlockCollector*>(context);
     const FTBlockWindow& w = ftBlockWindow;
-    try {
-        for (uint32_t b = firstBlock; b < endBlock; b++) c.recording->blocks.push_back(w.dataBuffers[b - w.firstBlock]);
-    } catch (const std::bad_alloc&) {
+    if (!tryAllocate([&] {
+            for (uint32_t b = firstBlock; b < endBlock; b++) c.recording->blocks.push_back(w.dataBuffers[b - w.firstBlock]);
+        })) {
         c.outOfMemory = 1;
         return 0;
     }
@@ -428,13 +429,14 @@ int analyseLearningFile(const std::string& path, LearningRecording* recording) {
         showMessage(MESSAGE_ERROR, RATE_TOO_HIGH_TEXT);
         return 0;
     }
-    // The song's stores are emptied and the learning mark taken off on every return.
+    // The song's stores are emptied and the learning mark taken off on every return (the pass
+    // makes no notes).
     struct EndLearningPass {
         bool marked;
         ~EndLearningPass() {
             releaseFrequencyAnalysis();
             recognitionOptions.learningInstruments = marked;
-            closeSong();
+            closeSongStores();
         }
     } endPass{recognitionOptions.learningInstruments};
     recognitionOptions.learningInstruments = true;
@@ -553,9 +555,7 @@ static int learnIntoTarget(const std::string& path, int replace, const LearningT
     }
     // The definition is learnt aside and counted in only when all its notes are learnt.
     InstrumentDefinition d;
-    try {
-        d = target.definition < 0 ? newDefinition(p) : t.definitions[size_t(target.definition)];
-    } catch (const std::bad_alloc&) {
+    if (!tryAllocate([&] { d = target.definition < 0 ? newDefinition(p) : t.definitions[size_t(target.definition)]; })) {
         showMessage(MESSAGE_ERROR, resourceString(10401));
         return 0;
     }
@@ -566,15 +566,15 @@ static int learnIntoTarget(const std::string& path, int replace, const LearningT
         const LearningNote& note = notes[size_t(k)];
         learnNoteSample(recording, note.start, note.end, d.middleA, &set.samples[p.sampleNumber]);
     }
-    try {
-        if (target.definition < 0) {
-            t.definitions.push_back(std::move(d));
-            t.current = int(t.definitions.size()) - 1;
-        } else {
-            t.definitions[size_t(target.definition)] = std::move(d);
-            t.current = target.definition;
-        }
-    } catch (const std::bad_alloc&) {
+    if (!tryAllocate([&] {
+            if (target.definition < 0) {
+                t.definitions.push_back(std::move(d));
+                t.current = int(t.definitions.size()) - 1;
+            } else {
+                t.definitions[size_t(target.definition)] = std::move(d);
+                t.current = target.definition;
+            }
+        })) {
         showMessage(MESSAGE_ERROR, resourceString(10401));
         return 0;
     }

@@ -6,9 +6,9 @@
 
 #include <cmath>
 #include <cstring>
-#include <new>
 
 #include "analysis/pitchScale.h"
+#include "platform/allocation.h"
 #include "platform/ui.h"
 #include "resources/generalMidi.h"
 #include "resources/strings.h"
@@ -62,9 +62,7 @@ int generateInstrumentDefinition(const std::string& name, int lowSemitone, int h
     d->middleA = float(DEFAULT_MIDDLE_A);
     d->lowSemitone = uint8_t(lowSemitone);
     d->highSemitone = uint8_t(highSemitone);
-    try {
-        d->semitones.assign(size_t(highSemitone - lowSemitone + 1), NoteSampleSet{});
-    } catch (const std::bad_alloc&) {
+    if (!tryAllocate([&] { d->semitones.assign(size_t(highSemitone - lowSemitone + 1), NoteSampleSet{}); })) {
         showMessage(MESSAGE_ERROR, resourceString(10401));
         return 0;
     }
@@ -100,9 +98,7 @@ int createInstrumentDefinition(const std::string& name, int lowSemitone, int hig
     }
     InstrumentDefinition d{};
     if (!generateInstrumentDefinition(name, lowSemitone, highSemitone, noteDuration, level, &d)) return 0;
-    try {
-        t.definitions.push_back(std::move(d));
-    } catch (const std::bad_alloc&) {
+    if (!tryAllocate([&] { t.definitions.push_back(std::move(d)); })) {
         showMessage(MESSAGE_ERROR, resourceString(10401));
         return 0;
     }

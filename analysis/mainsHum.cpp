@@ -3,7 +3,7 @@
 // the blocks to their pitch.
 #include "analysis/mainsHum.h"
 
-#include "analysis/noteRecognition.h"
+#include "analysis/recognitionBlocks.h"
 #include "analysis/recognitionOptions.h"
 #include "store/song.h"
 

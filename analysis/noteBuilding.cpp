@@ -10,13 +10,13 @@
 #include <vector>
 
 #include "analysis/analysisGeometry.h"
+#include "analysis/bandEnergy.h"
 #include "analysis/instrumentDefinitions.h"
-#include "analysis/noteRecognition.h"
+#include "analysis/recognitionBlocks.h"
 #include "analysis/pitchFlattening.h"
 #include "analysis/pitchScale.h"
 #include "analysis/recognitionOptions.h"
 #include "notes/noteList.h"
-#include "playback/midiOutput.h"
 #include "store/song.h"
 
 SongInstruments songInstruments;
@@ -539,24 +539,22 @@ static void matchCandidates(std::vector<NoteCandidate>& candidates, int voice) {
     for (NoteCandidate& c : candidates) c.definition = matchDefinition(c.semitone, c.pitch, voice, &c.fitted);
 }
 
-uint32_t buildNotes(uint32_t fromSample, int notesToDrop) {
-    uint32_t rate = song.waveFormat.samplesPerSec;
-    uint32_t songEnd = uint32_t(std::trunc(songDuration() * rate + 0.5));
-    for (int i = 0; i < notesToDrop && noteList.count > 0; i++) removeNote(noteList.count - 1);
-    const FTBlockWindow& w = ftBlockWindow;
-    uint32_t end = std::min(w.endBlock, song.blockCount);
-    uint32_t first = std::max(w.firstBlock, blockOfSample(fromSample));
-    if (first >= end || w.dataBuffers.size() < end - w.firstBlock) return songEnd;
-
+// Each block from first on starts again from the entries the analysis made: the amplitudes
+// come back and the note marks go.
+static void restoreEntries(uint32_t first, uint32_t end) {
     for (uint32_t b = first; b < end; b++) {
         FTDataBuffer& data = blockData(b);
         for (uint32_t i = 0; i < data.nEntries; i++) {
             data.entries[i].amplitude = data.entries[i].initialAmplitude;
-            data.entries[i].entryFlags &= uint8_t(~0x30);
+            data.entries[i].entryFlags &= uint8_t(~ENTRY_NOTE_MARKS);
         }
     }
+}
 
-    // Runs on one semitone, semitone by semitone from the lowest present.
+// The note candidates of blocks [first, end): runs on one semitone, semitone by semitone from
+// the lowest present, in time order, with their pitch, start and strength decided.
+static std::vector<NoteCandidate> gatherCandidates(uint32_t first, uint32_t end) {
+    const FTBlockWindow& w = ftBlockWindow;
     // The semitones are decided from a little before the first block on: the note that ends
     // there (built by an earlier call) decides where a glide out of it is split.
     uint32_t reachBack = uint32_t(std::max(1, blocksForSeconds(GLIDE_CONTEXT_SECONDS)));
@@ -594,93 +592,119 @@ uint32_t buildNotes(uint32_t fromSample, int notesToDrop) {
         startAtLoudnessLeap(candidates[i], i > 0 ? std::max(first, candidates[i - 1].end) : first, w.firstBlock);
     if (recognitionOptions.monophonicRecognition && recognitionOptions.findSyllables) snapToSyllables(candidates);
     for (NoteCandidate& c : candidates) measureCandidate(c);
+    return candidates;
+}
 
+// Matches the candidates to the instrument definitions. While the song's instrument is not
+// settled, the candidates count for their instruments; once two instruments are in use, the
+// one with the most notes (then the larger strength) is the song's, and the candidates are
+// matched again against its voice only.
+static void settleSongInstrument(std::vector<NoteCandidate>& candidates) {
+    SongInstruments& si = songInstruments;
+    matchCandidates(candidates, si.settledVoice);
+    if (si.settledVoice >= 0) return;
+    for (NoteCandidate& c : candidates) {
+        int slot = instrumentSlot(c.definition);
+        if (slot < 0) continue;
+        si.noteCounts[slot]++;
+        si.strengths[slot] += c.strength;
+    }
+    if (si.count < 2) return;
+    int best = 0;
+    for (int i = 1; i < si.count; i++)
+        if (si.noteCounts[i] > si.noteCounts[best] ||
+            (si.noteCounts[i] == si.noteCounts[best] && si.strengths[i] > si.strengths[best]))
+            best = i;
+    si.settledVoice = voiceOf(si.definitions[best]);
+    matchCandidates(candidates, si.settledVoice);
+}
+
+// Appends note to the list, unless its times do not hold (it is taken out again). False when
+// the list is full.
+static bool appendCheckedNote(const Note& note) {
+    if (!appendNote(note)) return false;
+    if (!validateNoteTimes(noteList.count - 1, false)) removeNote(noteList.count - 1);
+    return true;
+}
+
+// Appends the note of candidate c, split at the syllable starts well inside it when split is
+// set; times holds the start times of the blocks from first on. Nothing when its duration does
+// not suit its instrument's voice or the instrument list is full. False when the note list is full.
+static bool appendCandidateNote(const NoteCandidate& c, const std::vector<double>& times, uint32_t first, bool split) {
+    int voice = voiceOf(c.definition);
+    double duration = times[c.end - first] - times[c.first - first];
+    if (duration < shortestNoteSeconds(voice, c.semitone) || duration > longestSustainSeconds(voice, c.semitone))
+        return true;
+    int slot = instrumentSlot(c.definition);
+    if (slot < 0) return true;   // the instrument list is full: no more instruments, no note of one
+    Note note{};
+    note.pitch = float(c.pitch);
+    note.waveStart = float(times[c.first - first]);
+    note.waveEnd = float(times[c.first - first] + std::min(duration, MAX_NOTE_DURATION));
+    note.midiStart = note.waveStart;
+    note.midiEnd = note.waveEnd;
+    note.recognitionValues[0] = float(c.strength);
+    note.recognitionValues[1] = float(c.largest);
+    note.recognitionValues[2] = float(c.volumeSum) / float(c.end - c.first);
+    note.recognitionWeight = 100.0f;
+    // The semitone nearest to the note's pitch: a note held between two semitones keeps the
+    // one its blocks held, which need not be the nearest to their weighted mean.
+    note.midiNote = uint8_t(frequencyToSemitone(c.pitch));
+    note.recognitionCode = c.fitted ? NOTE_MATCHED_IN_RANGE : NOTE_OUTSIDE_DEFINITIONS;
+    note.recognitionExtra[0] = c.first;
+    note.recognitionExtra[1] = c.end - c.first;
+    note.instrument = c.definition < 0 ? 0 : c.definition;
+    note.sourceIndex = uint32_t(slot);
+    note.group = uint8_t(voice);
+    note.volumeSum = c.volumeSum;
+    note.recognitionTail = uint32_t(c.semitone);
+
+    // Split at the syllable starts well inside the note; each part sums its own blocks.
+    double inside = std::max(0.1, 1.5 * song.sampleBlockDuration);
+    uint32_t partFirst = c.first;
+    for (uint32_t b = c.first + 1; split && b < c.end; b++) {
+        if (!(blockData(b).blockFlags & BLOCK_SYLLABLE_START)) continue;
+        double t = times[b - first];
+        if (t - times[partFirst - first] < inside || times[c.end - first] - t < inside) continue;
+        Note part = note;
+        setPartPitch(part, partFirst, b, c.pitch);
+        part.waveStart = part.midiStart = float(times[partFirst - first]);
+        part.waveEnd = part.midiEnd = float(t);
+        part.recognitionCode |= NOTE_SPLIT_AT_SYLLABLE;
+        part.recognitionExtra[0] = partFirst;
+        part.recognitionExtra[1] = b - partFirst;
+        part.volumeSum = 0;
+        for (uint32_t k = partFirst; k < b; k++) part.volumeSum += blockData(k).nEntries ? blockData(k).entries[0].amplitude : 0;
+        note.volumeSum -= part.volumeSum;
+        note.recognitionCode |= NOTE_SPLIT_AT_SYLLABLE;
+        if (!appendCheckedNote(part)) return false;
+        partFirst = b;
+    }
+    if (partFirst != c.first) setPartPitch(note, partFirst, c.end, c.pitch);
+    note.waveStart = note.midiStart = float(times[partFirst - first]);
+    note.recognitionExtra[0] = partFirst;
+    note.recognitionExtra[1] = c.end - partFirst;
+    return appendCheckedNote(note);
+}
+
+uint32_t buildNotes(uint32_t fromSample, int notesToDrop) {
+    uint32_t rate = song.waveFormat.samplesPerSec;
+    uint32_t songEnd = uint32_t(std::trunc(songDuration() * rate + 0.5));
+    for (int i = 0; i < notesToDrop && noteList.count > 0; i++) removeNote(noteList.count - 1);
+    const FTBlockWindow& w = ftBlockWindow;
+    uint32_t end = std::min(w.endBlock, song.blockCount);
+    uint32_t first = std::max(w.firstBlock, blockOfSample(fromSample));
+    if (first >= end || w.dataBuffers.size() < end - w.firstBlock) return songEnd;
+
+    restoreEntries(first, end);
+    std::vector<NoteCandidate> candidates = gatherCandidates(first, end);
     // Block start times of [first, end], walked once.
     std::vector<double> times(end - first + 1);
     times[0] = songTimeOfBlock(first);
     for (uint32_t b = first; b < end; b++) times[b + 1 - first] = times[b - first] + blockDuration(b);
-
-    SongInstruments& si = songInstruments;
-    matchCandidates(candidates, si.settledVoice);
-    // Two instruments in use: the one with the most notes (then the larger strength) is the
-    // song's, and the candidates are matched again against its voice only.
-    if (si.settledVoice < 0) {
-        for (NoteCandidate& c : candidates) {
-            int slot = instrumentSlot(c.definition);
-            if (slot < 0) continue;
-            si.noteCounts[slot]++;
-            si.strengths[slot] += c.strength;
-        }
-        if (si.count >= 2) {
-            int best = 0;
-            for (int i = 1; i < si.count; i++)
-                if (si.noteCounts[i] > si.noteCounts[best] ||
-                    (si.noteCounts[i] == si.noteCounts[best] && si.strengths[i] > si.strengths[best]))
-                    best = i;
-            si.settledVoice = voiceOf(si.definitions[best]);
-            matchCandidates(candidates, si.settledVoice);
-        }
-    }
-
+    settleSongInstrument(candidates);
     bool split = recognitionOptions.monophonicRecognition && recognitionOptions.findSyllables;
-    double blockSeconds = song.sampleBlockDuration;
-    double inside = std::max(0.1, 1.5 * blockSeconds);
-    for (const NoteCandidate& c : candidates) {
-        int voice = voiceOf(c.definition);
-        double duration = times[c.end - first] - times[c.first - first];
-        if (duration < shortestNoteSeconds(voice, c.semitone) || duration > longestSustainSeconds(voice, c.semitone))
-            continue;
-        int slot = instrumentSlot(c.definition);
-        if (slot < 0) continue;   // the instrument list is full: no more instruments, no note of one
-        Note note{};
-        note.pitch = float(c.pitch);
-        note.waveStart = float(times[c.first - first]);
-        note.waveEnd = float(times[c.first - first] + std::min(duration, MAX_NOTE_DURATION));
-        note.midiStart = note.waveStart;
-        note.midiEnd = note.waveEnd;
-        note.recognitionValues[0] = float(c.strength);
-        note.recognitionValues[1] = float(c.largest);
-        note.recognitionValues[2] = float(c.volumeSum) / float(c.end - c.first);
-        note.recognitionWeight = 100.0f;
-        // The semitone nearest to the note's pitch: a note held between two semitones keeps the
-        // one its blocks held, which need not be the nearest to their weighted mean.
-        note.midiNote = uint8_t(frequencyToSemitone(c.pitch));
-        note.recognitionCode = c.fitted ? NOTE_MATCHED_IN_RANGE : NOTE_OUTSIDE_DEFINITIONS;
-        note.recognitionExtra[0] = c.first;
-        note.recognitionExtra[1] = c.end - c.first;
-        note.instrument = c.definition < 0 ? 0 : c.definition;
-        note.sourceIndex = uint32_t(slot);
-        note.group = uint8_t(voiceOf(c.definition));
-        note.volumeSum = c.volumeSum;
-        note.recognitionTail = uint32_t(c.semitone);
-
-        // Split at the syllable starts well inside the note; each part sums its own blocks.
-        uint32_t partFirst = c.first;
-        for (uint32_t b = c.first + 1; split && b < c.end; b++) {
-            if (!(blockData(b).blockFlags & BLOCK_SYLLABLE_START)) continue;
-            double t = times[b - first];
-            if (t - times[partFirst - first] < inside || times[c.end - first] - t < inside) continue;
-            Note part = note;
-            setPartPitch(part, partFirst, b, c.pitch);
-            part.waveStart = part.midiStart = float(times[partFirst - first]);
-            part.waveEnd = part.midiEnd = float(t);
-            part.recognitionCode |= NOTE_SPLIT_AT_SYLLABLE;
-            part.recognitionExtra[0] = partFirst;
-            part.recognitionExtra[1] = b - partFirst;
-            part.volumeSum = 0;
-            for (uint32_t k = partFirst; k < b; k++) part.volumeSum += blockData(k).nEntries ? blockData(k).entries[0].amplitude : 0;
-            note.volumeSum -= part.volumeSum;
-            note.recognitionCode |= NOTE_SPLIT_AT_SYLLABLE;
-            if (!appendNote(part)) return songEnd;
-            if (!validateNoteTimes(noteList.count - 1, false)) removeNote(noteList.count - 1);
-            partFirst = b;
-        }
-        if (partFirst != c.first) setPartPitch(note, partFirst, c.end, c.pitch);
-        note.waveStart = note.midiStart = float(times[partFirst - first]);
-        note.recognitionExtra[0] = partFirst;
-        note.recognitionExtra[1] = c.end - partFirst;
-        if (!appendNote(note)) return songEnd;
-        if (!validateNoteTimes(noteList.count - 1, false)) removeNote(noteList.count - 1);
-    }
+    for (const NoteCandidate& c : candidates)
+        if (!appendCandidateNote(c, times, first, split)) break;
     return songEnd;
 }

@@ -3,7 +3,7 @@
 // are note candidates; each is matched against the instrument definitions, kept when its
 // duration suits the instrument's voice, given its pitch (notePitch) and appended to the note
 // list, and split at syllable starts. The song's instrument list (at most 16) records the
-// instruments the notes use. buildNotes (noteRecognition.h) is the entry point.
+// instruments the notes use.
 
 #include <cstdint>
 
@@ -60,6 +60,14 @@ extern SongInstruments songInstruments;
 
 // Empties the list (song close, a new whole-song analysis).
 void resetSongInstruments();
+
+// Removes the last notesToDrop notes, then appends the notes found from the block of
+// fromSample to the song's end. Returns the sample position the next chunk's caller keeps.
+uint32_t buildNotes(uint32_t fromSample, int notesToDrop);
+
+// entryFlags bits 4 and 5: marks the instrument matching leaves on the entries a note has used.
+// Note building clears them, and restores the amplitudes, before it builds from a block again.
+constexpr uint8_t ENTRY_NOTE_MARKS = 0x30;
 
 // recognitionCode bits of a recognised note.
 constexpr uint32_t NOTE_MATCHED_IN_RANGE = 1;      // an instrument definition's range and sample fit it

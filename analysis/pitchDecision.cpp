@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "analysis/analysisGeometry.h"
+#include "analysis/bandEnergy.h"
 #include "analysis/mainsHum.h"
 #include "analysis/pitchScale.h"
 #include "analysis/recognitionOptions.h"
@@ -158,13 +159,24 @@ static bool octaveCarries(uint32_t block, uint32_t endBlock, const FTDataBuffer&
     return present * OCTAVE_PRESENCE_SHARE_DIVISOR >= (end - first) * OCTAVE_PRESENCE_SHARE_MULTIPLE;
 }
 
-// The chosen entry of block, or -1. With useRange the octave check's range applies.
-static int chooseFundamental(uint32_t block, uint32_t endBlock, bool useRange, int rangeLow, int rangeHigh,
-                             bool* skippedByRange, bool faint) {
+// What the choice of one block's fundamental looks at, and what it found besides the entry.
+struct FundamentalChoice {
+    uint32_t block;        // the block decided
+    uint32_t endBlock;     // the pass's end: band energies are not read beyond it
+    bool useRange;         // the octave check's range applies: entries more than an octave outside
+    int rangeLow;          // ... the semitones rangeLow .. rangeHigh (MIDI numbers) are left out
+    int rangeHigh;
+    bool faint;            // entries below the band limit may decide (CARRIED_BAND_LIMIT instead)
+    bool skippedByRange;   // set when an entry was left out for lying outside the range
+};
+
+// The chosen entry of the block, or -1.
+static int chooseFundamental(FundamentalChoice& choice) {
+    uint32_t block = choice.block, endBlock = choice.endBlock;
     const FTDataBuffer& data = blockOrigData(block);
     const AnalysisGeometry& g = analysisGeometry;
     int cutOff = data.nEntries ? data.entries[0].cutOffLevel : 0;
-    double bandLimit = faint ? CARRIED_BAND_LIMIT : std::max(BAND_LEVEL_LIMIT, cutOff / 8);
+    double bandLimit = choice.faint ? CARRIED_BAND_LIMIT : std::max(BAND_LEVEL_LIMIT, cutOff / 8);
     // In a quiet block no entry reaches the entry limit; the strongest entries of the block
     // then stand in for strong ones, so that the harmonics of a quiet note still point to
     // its fundamental rather than leaving the choice to the loudest partial.
@@ -179,10 +191,10 @@ static int chooseFundamental(uint32_t block, uint32_t endBlock, bool useRange, i
     for (uint32_t i = 0; i < data.nEntries; i++) {
         const FrequencyEntry& e = data.entries[i];
         if (!e.amplitude || isHumFrequency(e.frequency)) continue;
-        if (useRange) {
+        if (choice.useRange) {
             double p = frequencyToPitch(e.frequency);
-            if (p < rangeLow - OCTAVE_CHECK_SEMITONES || p > rangeHigh + OCTAVE_CHECK_SEMITONES) {
-                *skippedByRange = true;
+            if (p < choice.rangeLow - OCTAVE_CHECK_SEMITONES || p > choice.rangeHigh + OCTAVE_CHECK_SEMITONES) {
+                choice.skippedByRange = true;
                 continue;
             }
         }
@@ -362,14 +374,21 @@ void decideBlockPitches(const RecognitionPass& pass) {
     for (uint32_t b = final; b < end; b++) {
         int low = 0, high = 0;
         bool useRange = o.octaveCheck && referenceLimits(reference, needed, &low, &high);
-        bool skipped = false;
-        int chosen = chooseFundamental(b, end, useRange, low, high, &skipped, false);
+        FundamentalChoice choice{b, end, useRange, low, high, false, false};
+        int chosen = chooseFundamental(choice);
         // The range keeps stray entries out; it must not silence a melody that leaps past it.
-        if (chosen < 0 && skipped) chosen = chooseFundamental(b, end, false, 0, 0, &skipped, false);
+        if (chosen < 0 && choice.skippedByRange) {
+            choice.useRange = false;
+            chosen = chooseFundamental(choice);
+        }
         // Where nothing reaches the band limit a note may be rising or handing over to the
         // next: a faint entry that holds on ahead still decides the block, and the cleaning
         // passes drop what stays weak.
-        if (chosen < 0) chosen = chooseFundamental(b, end, useRange, low, high, &skipped, true);
+        if (chosen < 0) {
+            choice.useRange = useRange;
+            choice.faint = true;
+            chosen = chooseFundamental(choice);
+        }
         if (chosen >= 0) chosen = peakOfPartial(blockOrigData(b), chosen);
         if (chosen >= 0) bands[b - first] = growBand(b, chosen);
         addReference(reference, chosen >= 0 ? frequencyToSemitone(blockOrigData(b).entries[chosen].frequency) : -1);

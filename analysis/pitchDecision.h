@@ -6,7 +6,7 @@
 
 #include <cstdint>
 
-#include "analysis/noteRecognition.h"
+#include "analysis/recognitionBlocks.h"
 
 // Level limits from a chunk's automatic cut-off level.
 constexpr int ENTRY_LEVEL_LIMIT = 40;        // the entry test: a strong candidate reaches max(40, cut-off),

@@ -6,7 +6,7 @@
 #include <cmath>
 #include <vector>
 
-#include "analysis/noteRecognition.h"
+#include "analysis/recognitionBlocks.h"
 #include "analysis/pitchScale.h"
 #include "analysis/recognitionOptions.h"
 #include "store/song.h"

@@ -7,7 +7,7 @@
 #include <vector>
 
 #include "analysis/analysisGeometry.h"
-#include "analysis/noteRecognition.h"
+#include "analysis/recognitionBlocks.h"
 #include "analysis/pitchDecision.h"
 #include "analysis/pitchScale.h"
 #include "analysis/recognitionOptions.h"

@@ -3,10 +3,7 @@
 #include "analysis/spectrogram.h"
 
 #include <algorithm>
-#include <atomic>
 #include <cmath>
-#include <new>
-#include <stdexcept>
 
 #include "analysis/amplitudeHistogram.h"
 #include "analysis/analysisGeometry.h"
@@ -17,22 +14,11 @@
 #include "analysis/vector/spectrum.h"
 #include "analysis/vector/vectorTable.h"
 #include "analysis/vector/window.h"
+#include "platform/allocation.h"
 #include "platform/ui.h"
 #include "resources/strings.h"
 
 MagnitudeSpectrogram magnitudeSpectrogram;
-
-static std::atomic<int> allocationFailAt{0};   // growths left until the injected failure; 0 = none
-
-void failSpectrogramAllocation(int n) { allocationFailAt = n > 0 ? n : 0; }
-
-static bool allocationRefused() {
-    int left = allocationFailAt.load();
-    while (left > 0) {
-        if (allocationFailAt.compare_exchange_weak(left, left - 1)) return left == 1;
-    }
-    return false;
-}
 
 static const uint32_t SILENCE_LEVEL_8_BIT = 1024;   // x 2^(bits - 8): the silence gate's level
 
@@ -61,10 +47,7 @@ int resetMagnitudeSpectrogram(uint32_t sampleRate, int bitsPerSample) {
     s.binsPerRow = spectrogramBinsForRate(sampleRate);
     s.hop = spectrogramHopForRate(sampleRate);
     s.binWidth = float(sampleRate / 2.0 / s.binsPerRow);
-    try {
-        if (allocationRefused()) throw std::bad_alloc();
-        s.window.resize(2 * s.binsPerRow);
-    } catch (const std::bad_alloc&) {
+    if (!tryResize(s.window, 2 * s.binsPerRow)) {
         freeMagnitudeSpectrogram();
         showMemoryMessage();
         return 0;
@@ -158,13 +141,7 @@ int createMagnitudeSpectrogram(uint32_t firstSample) {
     uint32_t rows = uint32_t((limit - start) / s.hop);
     if (rows == 0) return first;
     size_t values = size_t(rows) * s.binsPerRow;
-    try {
-        if (allocationRefused()) throw std::bad_alloc();
-        s.magnitudes.resize(size_t(s.rowCount) * s.binsPerRow + values);
-    } catch (const std::bad_alloc&) {
-        showMemoryMessage();
-        return -1;
-    } catch (const std::length_error&) {
+    if (!tryResize(s.magnitudes, size_t(s.rowCount) * s.binsPerRow + values)) {
         showMemoryMessage();
         return -1;
     }

@@ -47,6 +47,3 @@ void dropSpectrogramRowsBefore(uint32_t samplePosition);
 
 // Row r's magnitudes (binsPerRow of them); r must be below rowCount.
 const uint32_t* spectrogramRow(uint32_t r);
-
-// Tests: the nth growth of the spectrogram's rows from now fails (1 = the next); 0 = off.
-void failSpectrogramAllocation(int n);

@@ -7,7 +7,7 @@
 #include <cmath>
 
 #include "analysis/amplitudeHistogram.h"
-#include "analysis/noteRecognition.h"
+#include "analysis/recognitionBlocks.h"
 #include "analysis/pitchTrackCleaning.h"
 #include "analysis/spectrogram.h"
 #include "shell/settings.h"

@@ -1,12 +1,19 @@
 #pragma once
 // Whole-song analysis and the rhythm in which recognition follows an analysis pass chunk by
 // chunk: which notes the next chunk may change, where recognition restarts, and which blocks
-// it rewrites. analyseSong (noteRecognition.h) runs after a recording made with the recorder
-// dialog; the command-line tool's analyse command runs the same pass over a wave file.
+// it rewrites. analyseSong runs after a recording made with the recorder dialog; the
+// command-line tool's analyse command runs the same pass over a wave file.
 
 #include <cstdint>
 
 #include "analysis/chunkedAnalysis.h"
+
+// Whole-song analysis: frequency tables when the song has none yet (from CS.fw, chunk by chunk,
+// with recognition following), else recognition over the stored tables, window by window; the
+// note list and the song's instrument list are built afresh. 1 when the pass ran to the song's
+// end; 0 without a wave format or samples, while a recording or an opening runs, when the song
+// has tables and "Remove Low Amplitudes" or monophonic recognition is off, or after a step's message.
+int analyseSong();
 
 // Recognition follows the analysis at least this much song apart, seconds; the last chunk is
 // always recognised. Each run looks back about three seconds, so running after every chunk

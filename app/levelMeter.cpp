@@ -9,7 +9,7 @@
 
 #include "app/mainFrame.h"
 #include "audio/audioActivity.h"
-#include "audio/openWaveFile.h"
+#include "audio/levelMeter.h"
 #include "platform/clock.h"
 #include "playback/meterGeometry.h"
 #include "playback/songViewGeometry.h"

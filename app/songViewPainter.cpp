@@ -42,6 +42,7 @@ const SongViewColours& songViewColours() {
         QColor(0xe0, 0x7b, 0x28),   // selectedBarline
         QColor(0x2f, 0x6d, 0xa8),   // timeSelection
         48,                         // timeSelectionAlpha
+        QColor(0xdc, 0xe7, 0xf2),   // timeSelectionOpaque
         QColor(0x2f, 0x6d, 0xa8),   // note
         QColor(0x5b, 0x95, 0xcc),   // noteLight
         QColor(0x1f, 0x4e, 0x7c),   // noteOutline
@@ -108,7 +109,6 @@ void paintGrid(Painting& p) {
 
     double spacing = chromatic && !diatonic ? chromaticPixelsPerSemitone() : diatonicPixelsPerStep();
     p.g.setFont(labelFont());
-    QFontMetrics metrics(p.g.font());
     p.g.fillRect(0, 0, geo.plotLeft, p.height - PLOT_BOTTOM_MARGIN, p.c.labelColumn);
     p.g.setPen(p.c.octaveLine);
     p.g.drawLine(geo.plotLeft - 1, 0, geo.plotLeft - 1, p.height - PLOT_BOTTOM_MARGIN);
@@ -134,7 +134,6 @@ void paintGrid(Painting& p) {
         p.g.setPen(octave ? p.c.octaveLine : p.c.gridLine);
         p.g.drawLine(geo.plotLeft - 6, y, geo.plotLeft - 1, y);
     }
-    (void)metrics;
 }
 
 void paintTimeSelection(Painting& p) {
@@ -146,7 +145,7 @@ void paintTimeSelection(Painting& p) {
     int bottom = p.height - PLOT_BOTTOM_MARGIN;
     QColor fill = p.c.timeSelection;
     if (p.translucent) fill.setAlpha(p.c.timeSelectionAlpha);
-    else fill = QColor(0xdc, 0xe7, 0xf2);
+    else fill = p.c.timeSelectionOpaque;
     p.g.fillRect(left, 0, right - left, bottom, fill);
     p.g.setPen(QPen(p.c.timeSelection, 1));
     if (timeToX(s.timeSelectionStart) >= songViewGeometry.plotLeft) p.g.drawLine(left, 0, left, bottom);

@@ -23,6 +23,7 @@ struct SongViewColours {
     QColor selectedBarline;
     QColor timeSelection;   // drawn at timeSelectionAlpha when translucent fills are on
     int timeSelectionAlpha;
+    QColor timeSelectionOpaque;   // its fill when translucent fills are off
     QColor note;
     QColor noteLight;       // the top of a note's gradient
     QColor noteOutline;

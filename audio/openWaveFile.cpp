@@ -1,5 +1,5 @@
 // Opening a wave file: the checks and the set-up on the main thread, the hand-over to the
-// worker and the end of an opening, and the level meter's values.
+// worker, and the waits and resets around a running opening.
 #include "audio/openWaveFile.h"
 
 #include <algorithm>
@@ -12,35 +12,24 @@
 #include "analysis/frequencyAnalysis.h"
 #include "analysis/recognitionOptions.h"
 #include "audio/audioActivity.h"
+#include "audio/levelMeter.h"
 #include "audio/openWaveWorker.h"
 #include "audio/waveWorkingFile.h"
 #include "platform/clock.h"
 #include "platform/files.h"
 #include "platform/mainloop.h"
 #include "platform/ui.h"
-#include "shell/mainFrame.h"
 #include "shell/paths.h"
-#include "shell/saveSong.h"
 #include "shell/settings.h"
-#include "shell/startup.h"
 #include "store/ftBlockStore.h"
 #include "store/hiresFTBlockStore.h"
 #include "store/song.h"
+#include "store/songWindowHooks.h"
 #include "store/undo.h"
 
-OpeningState openingState;
-LevelMeter levelMeter;
 
 // The source format while no file is open.
 static const WaveFormatRecord DEFAULT_SOURCE_FORMAT = {WAVE_FORMAT_PCM, 1, 44100, 88200, 2, 16, 0};
-
-// Reference levels of the meter: the rms that fills it, for 8- and 16-bit samples.
-static const double METER_REFERENCE_8_BIT = 89.789;
-static const double METER_REFERENCE_16_BIT = 23166.269;
-
-// Undo snapshots arrive with the undo store; until then an opening takes none, and this
-// stands where the snapshot is taken.
-static void takeUndoSnapshotNotYetBuilt() {}
 
 static void releaseChunkBuffer() {
     OpeningState& o = openingState;
@@ -147,11 +136,14 @@ int openWaveFile(const std::string& path) {
     if (!openFTFile(FT_UPDATE) || !openHiresFTFile(FT_UPDATE)) return 1;
     unwind.armed = false;
 
-    showSongView();
+    songWindowHooks.showSongView();
     prepareSongWorker(fullPath(path), false);
     processing.unlock();
     audioActivity.opening = true;
-    takeUndoSnapshotNotYetBuilt();
+    audioActivity.openingSeconds =
+        o.sourceDuration + (song.waveFormat.samplesPerSec ? double(o.samplesBefore) / song.waveFormat.samplesPerSec : 0.0);
+    // The undo snapshot of the opening is taken here, before the worker starts: it is the
+    // undo store's to take, and this build has none yet.
     startWorker(o.worker, CSOpenWaveFileDataThread);
     if (!appending) setSongNamesFromFile(path);
     return 1;
@@ -192,13 +184,6 @@ void requestOpeningStop() {
     if (openingState.worker.thread.joinable()) requestWorkerStop(openingState.worker);
 }
 
-void openingEnded() {
-    joinWorker(openingState.worker);
-    audioActivity.opening = false;
-    redrawSongView();
-    updateFrameDisplay();   // the status bar no longer says the song is being opened
-}
-
 void waitForOpeningToEnd() {
     // The flag stays set until openingEnded runs here, so the worker's last call is served too.
     while (audioActivity.opening && openingState.worker.thread.joinable()) {
@@ -211,6 +196,7 @@ void resetOpeningState() {
     requestWorkerStop(o.worker);
     joinWorker(o.worker);
     audioActivity.opening = false;
+    audioActivity.openingSeconds = 0;
     releaseChunkBuffer();
     o.sourcePath.clear();
     o.sourceFormat = DEFAULT_SOURCE_FORMAT;
@@ -230,27 +216,4 @@ void resetOpeningState() {
     resetOpeningProgress();
     std::lock_guard<std::mutex> guard(levelMeter.lock);
     std::fill(std::begin(levelMeter.levels), std::end(levelMeter.levels), 0);
-}
-
-int levelMeterValue(const uint8_t* samples, uint32_t count, int bitsPerSample) {
-    if (count == 0) return 0;
-    double sum = 0;
-    for (uint32_t i = 0; i < count; i++) {
-        double x;
-        if (bitsPerSample == 16) x = double(int16_t(uint16_t(samples[2 * i] | samples[2 * i + 1] << 8)));
-        else x = double(samples[i]) - 128.0;
-        sum += x * x;
-    }
-    double rms = std::sqrt(sum / count);
-    double r = bitsPerSample == 16 ? METER_REFERENCE_16_BIT : METER_REFERENCE_8_BIT;
-    double value = LEVEL_METER_FULL_SCALE * std::log10(std::max(0.0, rms - r / 32) + 1) /
-                   std::log10(std::max(0.0, r - r / 32) + 1);
-    // Above the reference the rule gives more than the meter can draw.
-    return std::min(int(value), LEVEL_METER_FULL_SCALE);
-}
-
-void pushLevelMeterValue(int value) {
-    std::lock_guard<std::mutex> guard(levelMeter.lock);
-    std::copy(levelMeter.levels + 1, levelMeter.levels + LEVEL_METER_BARS, levelMeter.levels);
-    levelMeter.levels[LEVEL_METER_BARS - 1] = value;
 }

@@ -11,34 +11,36 @@
 #include <cstring>
 #include <memory>
 #include <mutex>
-#include <new>
-#include <stdexcept>
 #include <thread>
 
 #include "analysis/analysisGeometry.h"
 #include "analysis/analysisSampleBuffer.h"
 #include "analysis/frequencyAnalysis.h"
 #include "analysis/frequencyTable.h"
+#include "analysis/noteBuilding.h"
 #include "analysis/noteRecognition.h"
 #include "analysis/recognitionOptions.h"
 #include "analysis/spectrogram.h"
-#include "audio/openWaveFile.h"
+#include "audio/audioActivity.h"
+#include "audio/levelMeter.h"
 #include "audio/waveWorkingFile.h"
 #include "notes/noteList.h"
+#include "platform/allocation.h"
 #include "platform/clock.h"
 #include "platform/files.h"
 #include "platform/mainloop.h"
 #include "platform/sync.h"
 #include "platform/ui.h"
 #include "resources/strings.h"
-#include "shell/mainFrame.h"
 #include "shell/paths.h"
 #include "store/fileRoutines.h"
 #include "store/ftBlockStore.h"
 #include "store/hiresFTBlockStore.h"
 #include "store/song.h"
+#include "store/songWindowHooks.h"
 #include "store/undo.h"
 
+OpeningState openingState;
 OpeningProgress openingProgress;
 
 static const char* const THREAD_OPEN_TEXT_1 = "Input Wave file could not be opened by CSOpenWaveFileDataThread (1)";
@@ -119,12 +121,7 @@ static int fillChunkBuffer(WaveReadInfo& info, uint32_t count, bool firstChunk, 
         o.bufferFirstSample += drop;
     }
     size_t wanted = kept + size_t(count) * bps;
-    try {
-        if (o.chunkBuffer.size() < wanted) o.chunkBuffer.resize(wanted);
-    } catch (const std::bad_alloc&) {
-        showMessage(MESSAGE_ERROR, resourceString(10401));
-        return 0;
-    } catch (const std::length_error&) {
+    if (o.chunkBuffer.size() < wanted && !tryResize(o.chunkBuffer, wanted)) {
         showMessage(MESSAGE_ERROR, resourceString(10401));
         return 0;
     }
@@ -284,7 +281,7 @@ static void redrawBetweenChunks() {
         int expected = REDRAW_POSTED;
         if (!p.redrawState.compare_exchange_strong(expected, REDRAW_RUNNING)) return;   // withdrawn
         uint32_t start = clockMilliseconds();
-        redrawSongView();
+        songWindowHooks.redrawSongView();
         p.redrawTook = clockMilliseconds() - start;
         p.redrawStartedAt = start;
         p.redrawState = REDRAW_IDLE;
@@ -443,4 +440,11 @@ void CSOpenWaveFileDataThread() {
         redrawBetweenChunks();
     }
     finishOpening();
+}
+
+void openingEnded() {
+    joinWorker(openingState.worker);
+    audioActivity.opening = false;
+    songWindowHooks.redrawSongView();
+    songWindowHooks.updateFrameDisplay();   // the status bar no longer says the song is being opened
 }

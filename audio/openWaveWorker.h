@@ -2,11 +2,51 @@
 // CSOpenWaveFileDataThread, the opening's worker: it reads the file chunk by chunk into the
 // opening state's chunk buffer, reduces each chunk to one channel, hands it on with
 // cantoscopeWaveformData (spectrogram, frequency tables, Hires FT blocks, CS.fw, note
-// recognition) and finishes the opening. Started by openWaveFile; never touches a window:
-// redraws are posted to the main loop.
+// recognition) and finishes the opening. Started by openWaveFile (audio/openWaveFile.h), which
+// fills the opening state first; never touches a window: redraws are posted to the main loop.
 
 #include <atomic>
 #include <cstdint>
+#include <string>
+#include <vector>
+
+#include "audio/waveFile.h"
+#include "platform/sync.h"
+
+// The opening in progress (one song, one opening at a time). The main thread fills it in
+// openWaveFile before the worker starts; from then on the worker owns every field but the
+// worker handle, and the main thread reads them again once the worker has ended.
+struct OpeningState {
+    std::string sourcePath;         // full path of the file being opened
+    WaveFormatRecord sourceFormat;  // copy of the file's format; the default record (PCM) when none is open
+    float sourceDuration;           // data samples / samples per second of the file, seconds
+    uint32_t samplesBefore;         // song samples that existed when the opening started (0 for a new song)
+    uint32_t samplesDone;           // song samples handed to analysis: where the next frequency table starts
+    uint32_t samplesRead;           // frames of the file read so far
+    uint32_t sourceBytesRead;       // bytes of the file's data chunk consumed so far
+    uint32_t storedSamples;         // song samples CS.fw holds
+    std::vector<uint8_t> chunkBuffer;   // the song's sample size: history (a silent lead-in at first), then a chunk
+    uint32_t bufferBytes;           // valid bytes in chunkBuffer
+    uint32_t bufferSamples;         // valid samples in chunkBuffer
+    int64_t bufferFirstSample;      // song position of chunkBuffer's first sample (negative in a new song's lead-in)
+    int64_t endOfSource;            // song position after the file's last whole block once it is all read, else -1
+    double recognitionShare;        // of the time since recognition last started that it may take (0.2, 0.1 with boost)
+    double displayShare;            // the same for redrawing the song view (0.1, 0.05 with boost)
+    uint32_t startTime;             // time counter when the opening started, hundredths of a second
+    int (*quickPreferences)();      // installed by the desktop program: the accuracy/speed preferences before
+                                    // opening into an empty song; 1 confirmed, 0 cancelled; null: not offered
+    bool recording;                 // the worker reads a recording from CS.fw rather than a file (recorder)
+    std::atomic<uint32_t> recordedBytes;    // while recording: CS.fw's data bytes stored so far (recorder)
+    std::atomic<bool> recordingComplete;    // while recording: the last stretch is stored, no more comes (recorder)
+    // The recorder's part at a recording's moments (audio/recording.h fills them): after each
+    // chunk, with the samples analysed; as the worker finishes (CS.fw finalised); and posted as
+    // the worker's last act, in place of openingEnded.
+    void (*recordingChunkDone)(uint32_t samplesAnalysed);
+    void (*finishRecording)();
+    void (*recordingEnded)();
+    SuspendableWorker worker;       // CSOpenWaveFileDataThread; its stop request is the user's stop
+};
+extern OpeningState openingState;
 
 // The redraw hand-shake: the song view reads the song only between chunks, so the worker
 // waits while its posted redraw runs, and withdraws one the main loop is slow to serve.
@@ -49,3 +89,8 @@ int cantoscopeWaveformData();
 
 // Empties the progress (a new opening, tests).
 void resetOpeningProgress();
+
+// Posted to the main loop by the worker as its last act: joins the thread, clears the
+// opening flag and redraws the song view, the meter and the frame's status.
+void openingEnded();
+

@@ -22,14 +22,13 @@
 #include "platform/mainloop.h"
 #include "platform/sync.h"
 #include "platform/ui.h"
-#include "shell/mainFrame.h"
 #include "shell/paths.h"
-#include "shell/saveSong.h"
 #include "shell/settings.h"
 #include "store/fileRoutines.h"
 #include "store/ftBlockStore.h"
 #include "store/hiresFTBlockStore.h"
 #include "store/song.h"
+#include "store/songWindowHooks.h"
 #include "store/undo.h"
 
 RecordingState recordingState;
@@ -41,7 +40,7 @@ static uint32_t bytesPerSample() { return uint32_t(song.waveFormat.bitsPerSample
 static void setLabelState(int state) {
     recordingState.labelState = state;
     if (recordingHooks.stateChanged) recordingHooks.stateChanged();
-    else updateFrameDisplay();
+    else songWindowHooks.updateFrameDisplay();
 }
 
 const char* recordLabel() {
@@ -256,7 +255,7 @@ int startRecording() {
     r.startBytes = song.workingWaveBytes;
     writeRecordingMarker();
 
-    showSongView();
+    songWindowHooks.showSongView();
     prepareSongWorker(sharedFilePath("CS.fw"), true);
     openingState.recordingChunkDone = recordingChunkDone;
     openingState.finishRecording = finishRecording;
@@ -391,7 +390,7 @@ void recordingEnded() {
     r.processingLag = 0;
     fileDelete(markerPath());
     setLabelState(RECORD_LABEL_IDLE);
-    redrawSongView();
+    songWindowHooks.redrawSongView();
 }
 
 void finishRecording() {

@@ -24,12 +24,12 @@
 #include "analysis/frequencyAnalysis.h"
 #include "analysis/recognitionOptions.h"
 #include "platform/files.h"
+#include "shell/closeSong.h"
 #include "shell/paths.h"
 #include "shell/settings.h"
 #include "store/ftBlockStore.h"
 #include "store/hiresFTBlockStore.h"
 #include "store/song.h"
-#include "store/workingFiles.h"
 #include "tests/analysis/signalGenerator.h"
 
 struct MelodySource {

@@ -25,11 +25,11 @@
 #include "notes/noteList.h"
 #include "platform/mainloop.h"
 #include "platform/ui.h"
+#include "shell/closeSong.h"
 #include "shell/mainFrame.h"
 #include "shell/settings.h"
 #include "shell/startup.h"
 #include "store/song.h"
-#include "store/workingFiles.h"
 #include "tests/analysis/signalGenerator.h"
 
 static const int TICK_TIMER_ID = 0x0B0001;

@@ -32,11 +32,11 @@
 #include "platform/ui.h"
 #include "playback/playback.h"
 #include "playback/songViewGeometry.h"
+#include "shell/closeSong.h"
 #include "shell/mainFrame.h"
 #include "shell/startup.h"
 #include "store/ftBlockStore.h"
 #include "store/song.h"
-#include "store/workingFiles.h"
 
 static double wallMs() {
     return std::chrono::duration<double, std::milli>(std::chrono::steady_clock::now().time_since_epoch()).count();

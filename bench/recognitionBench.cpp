@@ -23,12 +23,12 @@
 #include "analysis/wholeSongAnalysis.h"
 #include "notes/noteList.h"
 #include "platform/files.h"
+#include "shell/closeSong.h"
 #include "shell/paths.h"
 #include "shell/settings.h"
 #include "store/ftBlockStore.h"
 #include "store/hiresFTBlockStore.h"
 #include "store/song.h"
-#include "store/workingFiles.h"
 #include "tests/analysis/signalGenerator.h"
 
 struct MelodySource {

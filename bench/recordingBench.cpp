@@ -20,9 +20,9 @@
 #include "platform/capture.h"
 #include "platform/mainloop.h"
 #include "platform/ui.h"
+#include "shell/closeSong.h"
 #include "shell/startup.h"
 #include "store/song.h"
-#include "store/workingFiles.h"
 
 static const int TICK_TIMER_ID = 0x0B0002;
 

@@ -21,11 +21,11 @@
 #include "notes/noteList.h"
 #include "platform/files.h"
 #include "platform/ui.h"
+#include "shell/closeSong.h"
 #include "shell/settings.h"
 #include "store/ftBlockStore.h"
 #include "store/hiresFTBlockStore.h"
 #include "store/song.h"
-#include "store/workingFiles.h"
 
 static const uint32_t HIGHEST_SAMPLE_RATE = 44100;   // the opening path refuses faster files
 static const char* const RATE_TOO_HIGH_TEXT =

@@ -10,7 +10,7 @@
 #include "platform/files.h"
 #include "platform/ui.h"
 #include "store/song.h"
-#include "store/workingFiles.h"
+#include "shell/closeSong.h"
 
 const std::vector<CliCommand>& cliCommands() {
     static const std::vector<CliCommand> commands = {

@@ -17,9 +17,9 @@
 #include "platform/files.h"
 #include "platform/ui.h"
 #include "playback/midiOutput.h"
+#include "shell/closeSong.h"
 #include "shell/settings.h"
 #include "store/song.h"
-#include "store/workingFiles.h"
 
 static const int EXIT_FAILED = 1;
 static const int EXIT_USAGE = 2;

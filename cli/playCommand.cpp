@@ -16,7 +16,7 @@
 #include "playback/playback.h"
 #include "playback/playbackState.h"
 #include "playback/pointerInfo.h"
-#include "store/workingFiles.h"
+#include "shell/closeSong.h"
 
 static const int EXIT_FAILED = 1;
 static const int EXIT_USAGE = 2;

@@ -19,9 +19,9 @@
 #include "platform/mainloop.h"
 #include "platform/pulse/pulseBackends.h"
 #include "playback/midiOutput.h"
+#include "shell/closeSong.h"
 #include "shell/startup.h"
 #include "store/song.h"
-#include "store/workingFiles.h"
 
 static const int EXIT_FAILED = 1;
 static const int EXIT_USAGE = 2;

@@ -8,6 +8,7 @@
 #include <mutex>
 #include <vector>
 
+#include "platform/allocation.h"
 #include "platform/mainloop.h"
 
 static int noneAvailable() { return 0; }
@@ -76,11 +77,7 @@ int createCaptureBuffer(const CaptureFormat& format, uint32_t bytes) {
     // The backend is asked outside the lock: its own thread delivers holding its lock first.
     if (bytes == 0 || !captureFormatAvailable(format)) return CAPTURE_NO_BUFFER;
     std::lock_guard<std::mutex> guard(capture.lock);
-    try {
-        capture.bytes.assign(bytes, format.bits == 8 ? 0x80 : 0);
-    } catch (const std::bad_alloc&) {
-        return CAPTURE_NO_BUFFER;
-    }
+    if (!tryAllocate([&] { capture.bytes.assign(bytes, format.bits == 8 ? 0x80 : 0); })) return CAPTURE_NO_BUFFER;
     capture.format = format;
     capture.positionCount = 0;
     capture.written = capture.taken = capture.lockedEnd = 0;

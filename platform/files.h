@@ -32,6 +32,8 @@ void clearFileFailures();
 // ---- free disk space ----
 // Bytes available to the user on the file system holding folder; -1 when unknown.
 int64_t freeDiskSpace(const std::string& folder);
+// The figure the disk checks use when the free space is unknown (or, at start-up, beyond 32 bits).
+constexpr int64_t DISK_SPACE_UNKNOWN = 2147483648;
 // Tests set the figure freeDiskSpace reports; a negative value other than -1 removes it.
 void setFreeDiskSpaceOverride(int64_t bytes);
 constexpr int64_t NO_FREE_SPACE_OVERRIDE = -2;

@@ -19,7 +19,7 @@ void setCaptureEventHandler(void (*handler)());
 // The handler set last; a backend serving the event calls it.
 void (*captureEventHandler())();
 
-// Window timers: call every intervalMs (the design uses 10 ms) until stopped. Starting an
+// Window timers: call every intervalMs (the program's timers run every 10 ms) until stopped. Starting an
 // id that runs restarts it.
 void startTimer(int id, int intervalMs, std::function<void()> call);
 void stopTimer(int id);

@@ -1,5 +1,5 @@
 #pragma once
-// The four named mutexes of the design, and a worker thread that can suspend itself and be
+// The program's four named mutexes, and a worker thread that can suspend itself and be
 // resumed by another thread. Lock order: wait for the undo snapshot writer before taking
 // any of these and never while holding CSAccessWaveFileMutex; take CSWaveProcessingMutex
 // before CSAccessWaveFileMutex.

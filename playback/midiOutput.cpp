@@ -5,13 +5,13 @@
 
 #include <charconv>
 #include <cmath>
-#include <new>
 #include <vector>
 
 #include "analysis/pitchScale.h"
 #include "audio/audioActivity.h"
 #include "notes/noteList.h"
 #include "notes/selection.h"
+#include "platform/allocation.h"
 #include "platform/ui.h"
 #include "playback/midiFile.h"
 #include "resources/generalMidi.h"
@@ -27,10 +27,6 @@ MidiOutputSong midiOutputSong;
 static const int MAX_MIDI_KEY = 127;
 
 void resetMidiOutput() { midiOutputSong = MidiOutputSong{}; }
-
-std::string songInstrumentName() {
-    return midiOutputSong.instrumentName.empty() ? globalSettings.defaultInstrument : midiOutputSong.instrumentName;
-}
 
 int velocityFromLevel(float level) {
     float a = level >= 1.0f ? level : 1.0f;   // also catches not-a-number
@@ -228,9 +224,7 @@ static int writeDetailStretch(MidiFileWriter& w, int channel, const MidiRange& r
 
     std::vector<BlockPitch> blocks;
     if (toBlock > fromBlock) {
-        try {
-            blocks.resize(toBlock - fromBlock);
-        } catch (const std::bad_alloc&) {
+        if (!tryResize(blocks, toBlock - fromBlock)) {
             showMessage(MESSAGE_ERROR, resourceString(10401));
             return 0;
         }

@@ -31,17 +31,12 @@ extern MidiOutputOptions midiOutputOptions;
 
 // What the MIDI output keeps of the song.
 struct MidiOutputSong {
-    std::string instrumentName;    // the song's instrument (track name, program); "" until the song
-                                   // sets it, and then "CS Default Instrument" is used (song start, undo)
     int partCount = 1;             // the song's parts; instrument tracks when singleTrack is off (recognition)
 };
 extern MidiOutputSong midiOutputSong;
 
 // Both records back to their defaults (song close; tests between cases).
 void resetMidiOutput();
-
-// The name the instrument tracks carry and take their General MIDI program from.
-std::string songInstrumentName();
 
 // A level 0 .. 255 (any float) as a MIDI velocity 1 .. 127:
 // truncation of 127 x (max(a, 1) / 255)^log10(2) + 0.5. Not a number counts as 1.

@@ -20,9 +20,9 @@
 #include "playback/pointerInfo.h"
 #include "playback/songViewGeometry.h"
 #include "shell/appTimers.h"
-#include "shell/mainFrame.h"
 #include "shell/paths.h"
 #include "store/song.h"
+#include "store/songWindowHooks.h"
 
 static void playbackTimerCallback(int) { playbackTick(); }
 
@@ -34,8 +34,8 @@ static void afterStop() {
     if (isPlaying()) return;
     releaseEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, EVENT_WILDCARD, playbackTimerCallback);
     refreshPointerInfo();
-    updateFrameDisplay();
-    redrawSongView();
+    songWindowHooks.updateFrameDisplay();
+    songWindowHooks.redrawSongView();
 }
 
 // Stops and closes one mode's device and deletes its playback file.
@@ -73,8 +73,8 @@ static void startCursor(double start, double end) {
     // A full timer registry has said so; playback then runs without cursor updates.
     claimEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, EVENT_WILDCARD, playbackTimerCallback);
     refreshPointerInfo();
-    updateFrameDisplay();
-    redrawSongView();
+    songWindowHooks.updateFrameDisplay();
+    songWindowHooks.redrawSongView();
 }
 
 static void playMidi(double start, double end, int preview) {
@@ -197,13 +197,13 @@ void playbackTick() {
     bool scrolled = !p.preview && autoScrollSongView((position + 1) * 0.01, (p.end + 1) * 0.01);
     uint32_t now = clockMilliseconds();
     if (now - p.cursorMoved < PLAY_CURSOR_STEP_MS) {
-        if (scrolled) redrawSongView();
+        if (scrolled) songWindowHooks.redrawSongView();
         return;
     }
     p.cursor = position;
     p.cursorMoved = now;
     refreshPointerInfo();
-    redrawSongView();
+    songWindowHooks.redrawSongView();
 }
 
 void handleMediaNotification(int deviceId) {

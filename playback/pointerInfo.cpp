@@ -8,7 +8,6 @@
 
 #include "analysis/pitchScale.h"
 #include "audio/audioActivity.h"
-#include "audio/openWaveFile.h"
 #include "notes/displayModes.h"
 #include "notes/noteList.h"
 #include "notes/selection.h"
@@ -71,8 +70,7 @@ void updatePointerInfo(int x, int y) {
         return;
     }
     if (audioActivity.opening) {
-        double total = openingState.sourceDuration;
-        if (song.waveFormat.samplesPerSec > 0) total += double(openingState.samplesBefore) / song.waveFormat.samplesPerSec;
+        double total = audioActivity.openingSeconds;
         setTexts(POINTER_KIND_OPENING, formatSongTime(songDuration()), total > 0 ? formatSongTime(total) : "", "", "");
         return;
     }

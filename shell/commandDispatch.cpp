@@ -6,24 +6,12 @@
 #include "audio/openWaveFile.h"
 #include "audio/recording.h"
 #include "notes/displayModes.h"
-#include "playback/midiOutput.h"
 #include "playback/playback.h"
 #include "platform/ui.h"
 #include "shell/commandTable.h"
 #include "shell/mainFrame.h"
 #include "shell/menuEnabling.h"
 #include "shell/zoom.h"
-
-// The operations this build has, filled as their owners are built.
-CommandOperations commandOperations = [] {
-    CommandOperations operations{};
-    operations.openWaveFile = openWaveFile;
-    operations.writeNotesMidiFile = saveMidiFile;
-    operations.toggleRecording = startRecording;
-    operations.playSong = playSong;
-    operations.pausePlayback = pausePlayback;
-    return operations;
-}();
 
 std::string notAvailableText(const std::string& what) {
     return what + " is not available in this version of Torvellan Melodrift.";

@@ -6,12 +6,12 @@
 #include "notes/displayModes.h"
 #include "playback/playback.h"
 #include "platform/ui.h"
-#include "shell/commandDispatch.h"
+#include "shell/closeSong.h"
+#include "shell/commandOperations.h"
 #include "shell/commandTable.h"
-#include "shell/saveSong.h"
 #include "shell/settings.h"
 #include "store/song.h"
-#include "store/workingFiles.h"
+#include "store/songWindowHooks.h"
 
 FrameState frameState;
 
@@ -31,6 +31,8 @@ void redrawSongView() {
 }
 
 void songWindowOpened() { frameState.songWindowOpen = true; }
+
+const SongWindowHooks songWindowHooks = {showSongView, redrawSongView, updateFrameDisplay};
 
 void setFrameModal(bool on) {
     if (on) frameState.modalDepth++;
@@ -103,18 +105,6 @@ void applyDisplayModeSettings() {
         s.scaleMode = defaults.scaleMode;
     displayModes.playbackMode = s.playbackMode;
     displayModes.noteMode = s.noteMode;
-}
-
-int refuseWhileBusy() {
-    if (audioActivity.recording) {
-        showMessage(MESSAGE_INFORMATION, WHILST_RECORDING_TEXT);
-        return 1;
-    }
-    if (audioActivity.opening) {
-        showMessage(MESSAGE_INFORMATION, WHILST_OPENING_TEXT);
-        return 1;
-    }
-    return 0;
 }
 
 int frameMayClose() { return refuseWhileBusy() ? 0 : 1; }

@@ -53,12 +53,6 @@ void setLayout(int layout);       // LAYOUT_DIATONIC or LAYOUT_CHROMATIC
 // takes the setting's default (Wave, Detail, Chromatic).
 void applyDisplayModeSettings();
 
-// The refusals of work that would meet a running recording or opening.
-constexpr const char* WHILST_RECORDING_TEXT = "Sorry - this cannot be done whilst recording audio.";
-constexpr const char* WHILST_OPENING_TEXT = "Sorry - this cannot be done whilst opening audio.";
-// 1 after showing WHILST_RECORDING_TEXT (a recording runs) or WHILST_OPENING_TEXT (an
-// opening runs), else 0.
-int refuseWhileBusy();
 
 // The guard of closing the frame and of the end of the session: 0 after "Sorry - this cannot
 // be done whilst recording audio." or "... whilst opening audio.", else 1.

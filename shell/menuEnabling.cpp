@@ -6,7 +6,7 @@
 #include "notes/displayModes.h"
 #include "notes/noteList.h"
 #include "notes/selection.h"
-#include "shell/commandDispatch.h"
+#include "shell/commandOperations.h"
 #include "shell/commandTable.h"
 #include "shell/mainFrame.h"
 #include "shell/settings.h"

@@ -1,6 +1,7 @@
 // Save and Save As: the names, the output type and the writing.
 #include "shell/saveSong.h"
 
+#include "audio/audioActivity.h"
 #include "audio/waveWorkingFile.h"
 #include "notes/displayModes.h"
 #include "notes/selection.h"
@@ -10,17 +11,6 @@
 #include "shell/mainFrame.h"
 #include "shell/settings.h"
 #include "store/song.h"
-
-SongNames songNames;
-
-void resetSongNames() { songNames = SongNames{}; }
-
-void setSongNamesFromFile(const std::string& path) {
-    std::string name = path;
-    size_t dot = name.rfind('.');
-    if (dot != std::string::npos && dot + 4 >= name.size()) name.erase(dot);
-    for (std::string& remembered : songNames.remembered) remembered = name;
-}
 
 int currentOutputType() {
     if (displayModes.playbackMode == PLAYBACK_MODE_WAVE) return OUTPUT_WAVE;

@@ -1,8 +1,7 @@
 #pragma once
-// Save and Save As without their dialog: the output type the modes choose, the song's six
-// remembered names (for each output the name to propose and the name it was last written
-// under), the dialog's filter and proposed name, and the writing itself. The desktop
-// program shows the dialog; the opening sets the names of a new song.
+// Save and Save As without their dialog: the output type the modes choose, the dialog's
+// filter and proposed name (from the song's names, store/song.h), and the writing itself.
+// The desktop program shows the dialog.
 
 #include <string>
 
@@ -10,17 +9,6 @@
 // following the sung pitch in Detail mode.
 enum OutputType { OUTPUT_WAVE = 0, OUTPUT_MIDI = 1, OUTPUT_DETAIL_MIDI = 2 };
 
-struct SongNames {
-    std::string remembered[3];   // per OutputType: the name proposed (opening, saving)
-    std::string lastSaved[3];    // per OutputType: the name last written under (saving)
-};
-extern SongNames songNames;
-
-// Clears the six names (start-up, song close).
-void resetSongNames();
-// A new song takes the file's name without its extension as each remembered name: the last
-// "." within the last four characters and what follows are cut.
-void setSongNamesFromFile(const std::string& path);
 
 // The output type of the current modes.
 int currentOutputType();

@@ -4,6 +4,7 @@
 #include "shell/settings.h"
 
 #include <cstdio>
+#include <variant>
 #include <vector>
 
 #include "platform/ui.h"
@@ -104,49 +105,99 @@ static std::string firstCharacters(const std::string& text, int count) {
     return text.substr(0, end);
 }
 
-// Opens a section of the machine's root for a load; a failure ends start-up.
-static RegistryKey openForLoad(const char* section) {
-    RegistryKey key = openSettingsSection(section, REG_ROOT_MACHINE);
-    if (!key) quitFlag = 1;
-    return key;
+// One named value of a section and the field of the settings record that holds it. The kind
+// of value follows from the field's type; its default is the field's initial value.
+template <class Record>
+struct SettingValue {
+    const char* name;   // the value's name in the section
+    // An int or a byte (stored as a DWORD; a byte field keeps the low byte), a boolean
+    // ("True" or "False") or a text.
+    std::variant<int Record::*, uint8_t Record::*, bool Record::*, std::string Record::*> field;
+    int characters = 0;   // a text of at most this many characters is read and written; 0: any
+};
+
+static void readValue(RegistryKey key, const char* name, int, int& value, int defaultValue) {
+    value = readIntSetting(key, name, defaultValue);
+}
+static void readValue(RegistryKey key, const char* name, int, uint8_t& value, uint8_t defaultValue) {
+    value = uint8_t(readIntSetting(key, name, defaultValue));
+}
+static void readValue(RegistryKey key, const char* name, int, bool& value, bool defaultValue) {
+    value = readBoolSetting(key, name, defaultValue);
+}
+static void readValue(RegistryKey key, const char* name, int characters, std::string& value,
+                      const std::string& defaultValue) {
+    value = readTextSetting(key, name, defaultValue);
+    if (characters) value = firstCharacters(value, characters);
 }
 
-int loadGeneralSettings() {
-    RegistryKey key = openForLoad(GENERAL_SETTINGS_SECTION);
-    if (!key) return 0;
-    const GeneralSettings defaults;
-    generalSettings.splashScreen = readBoolSetting(key, "Splash screen", defaults.splashScreen);
-    generalSettings.quickPrefs = readBoolSetting(key, "Quick Prefs", defaults.quickPrefs);
-    openSettingsSection(nullptr, REG_ROOT_MACHINE);
-    return 1;
+static void writeValue(RegistryKey key, const char* name, int, int value) { writeIntSetting(key, name, value); }
+static void writeValue(RegistryKey key, const char* name, int, uint8_t value) { writeIntSetting(key, name, value); }
+static void writeValue(RegistryKey key, const char* name, int, bool value) { writeBoolSetting(key, name, value); }
+static void writeValue(RegistryKey key, const char* name, int characters, const std::string& value) {
+    writeTextSetting(key, name, characters ? firstCharacters(value, characters) : value);
 }
 
-int loadAudioGeneralSettings() {
-    RegistryKey key = openForLoad(GENERAL_SETTINGS_SECTION);
-    if (!key) return 0;
-    const GeneralSettings defaults;
-    GeneralSettings& s = generalSettings;
-    s.pitchRange = readIntSetting(key, "CS Pitch range", defaults.pitchRange);
-    s.enhancedPitchAccuracy = readBoolSetting(key, "CS Enhanced pitch accuracy", defaults.enhancedPitchAccuracy);
-    s.detectSyllables = readBoolSetting(key, "CS Detect syllables", defaults.detectSyllables);
-    s.disableWaveEditing = readBoolSetting(key, "CS Disable wave editing", defaults.disableWaveEditing);
-    s.drawSmoothLines = readBoolSetting(key, "CS Draw smooth lines", defaults.drawSmoothLines);
-    s.drawTransparencies = readBoolSetting(key, "CS Draw transparencies", defaults.drawTransparencies);
-    s.drawGradients = readBoolSetting(key, "CS Draw gradients", defaults.drawGradients);
-    openSettingsSection(nullptr, REG_ROOT_MACHINE);
-    return 1;
+// The values of each set in the order they are read and written.
+static const SettingValue<GeneralSettings> GENERAL_VALUES[] = {
+    {"Splash screen", &GeneralSettings::splashScreen},
+    {"Quick Prefs", &GeneralSettings::quickPrefs},
+};
+static const SettingValue<GeneralSettings> AUDIO_GENERAL_VALUES[] = {
+    {"CS Pitch range", &GeneralSettings::pitchRange},
+    {"CS Enhanced pitch accuracy", &GeneralSettings::enhancedPitchAccuracy},
+    {"CS Detect syllables", &GeneralSettings::detectSyllables},
+    {"CS Disable wave editing", &GeneralSettings::disableWaveEditing},
+    {"CS Draw smooth lines", &GeneralSettings::drawSmoothLines},
+    {"CS Draw transparencies", &GeneralSettings::drawTransparencies},
+    {"CS Draw gradients", &GeneralSettings::drawGradients},
+};
+// Followed by "Main window position" and the recent files, which are not single values.
+static const SettingValue<GlobalSettings> GLOBAL_VALUES[] = {
+    {"Translucent Windows", &GlobalSettings::translucentWindows},
+    {"Open Filter", &GlobalSettings::openFilter},
+    {"Save Filter", &GlobalSettings::saveFilter},
+    {"Open Directory", &GlobalSettings::openDirectory},
+    {"Save Directory", &GlobalSettings::saveDirectory},
+};
+static const SettingValue<GlobalSettings> AUDIO_GLOBAL_VALUES[] = {
+    {"CS Playback Mode", &GlobalSettings::playbackMode},
+    {"CS Note Mode", &GlobalSettings::noteMode},
+    {"CS Scale Mode", &GlobalSettings::scaleMode},
+    {"CS Meter width", &GlobalSettings::meterWidth},
+    {"CS Meter height", &GlobalSettings::meterHeight},
+    {"CS Meter x-offset", &GlobalSettings::meterXOffset},
+    {"CS Meter y-offset", &GlobalSettings::meterYOffset},
+    {"CS Meter anchor", &GlobalSettings::meterAnchor},
+    {"CS Default Instrument", &GlobalSettings::defaultInstrument, MAX_DEFAULT_INSTRUMENT_CHARACTERS},
+    {"Show CSSpeedWarning dialog", &GlobalSettings::showSpeedWarning},
+    {"CS Boost speed", &GlobalSettings::boostSpeed},
+    {"CS Input wave quality", &GlobalSettings::inputWaveQuality},
+};
+
+template <class Record, size_t N>
+static void readValues(RegistryKey key, const SettingValue<Record> (&values)[N], Record& s) {
+    const Record defaults;
+    for (const SettingValue<Record>& v : values)
+        std::visit([&](auto field) { readValue(key, v.name, v.characters, s.*field, defaults.*field); }, v.field);
 }
 
-int loadGlobalSettings() {
-    RegistryKey key = openForLoad(GLOBAL_SETTINGS_SECTION);
-    if (!key) return 0;
-    const GlobalSettings defaults;
-    GlobalSettings& s = globalSettings;
-    s.translucentWindows = readBoolSetting(key, "Translucent Windows", defaults.translucentWindows);
-    s.openFilter = readIntSetting(key, "Open Filter", defaults.openFilter);
-    s.saveFilter = readIntSetting(key, "Save Filter", defaults.saveFilter);
-    s.openDirectory = readTextSetting(key, "Open Directory", defaults.openDirectory);
-    s.saveDirectory = readTextSetting(key, "Save Directory", defaults.saveDirectory);
+template <class Record, size_t N>
+static void writeValues(RegistryKey key, const SettingValue<Record> (&values)[N], const Record& s) {
+    for (const SettingValue<Record>& v : values)
+        std::visit([&](auto field) { writeValue(key, v.name, v.characters, s.*field); }, v.field);
+}
+
+// "Recent file %d".
+static std::string recentFileName(int i) {
+    char name[32];
+    std::snprintf(name, sizeof name, "Recent file %d", i);
+    return name;
+}
+
+static int clampedRecentFileCount(int count) { return count < 0 ? 0 : count > MAX_RECENT_FILES ? MAX_RECENT_FILES : count; }
+
+static void readPlacementAndRecentFiles(RegistryKey key, GlobalSettings& s) {
     // The placement has no default: when it is absent (or not a placement) nothing is
     // written and the frame opens maximized.
     std::vector<uint8_t> placement;
@@ -154,105 +205,59 @@ int loadGlobalSettings() {
                               placement.size() == size_t(WINDOW_PLACEMENT_SIZE);
     if (s.hasMainWindowPosition)
         for (int i = 0; i < WINDOW_PLACEMENT_SIZE; i++) s.mainWindowPosition[i] = placement[i];
-    int count = readIntSetting(key, "Number of recent files", defaults.recentFileCount);
-    s.recentFileCount = count < 0 ? 0 : count > MAX_RECENT_FILES ? MAX_RECENT_FILES : count;
+    s.recentFileCount = clampedRecentFileCount(readIntSetting(key, "Number of recent files", GlobalSettings().recentFileCount));
     for (int i = 0; i < MAX_RECENT_FILES; i++) s.recentFiles[i].clear();
-    for (int i = 0; i < s.recentFileCount; i++) {
-        char name[32];
-        std::snprintf(name, sizeof name, "Recent file %d", i);
-        s.recentFiles[i] = readTextSetting(key, name, "");
-    }
-    openSettingsSection(nullptr, REG_ROOT_MACHINE);
-    return 1;
+    for (int i = 0; i < s.recentFileCount; i++) s.recentFiles[i] = readTextSetting(key, recentFileName(i), "");
 }
 
-int loadAudioGlobalSettings() {
-    RegistryKey key = openForLoad(GLOBAL_SETTINGS_SECTION);
-    if (!key) return 0;
-    const GlobalSettings defaults;
-    GlobalSettings& s = globalSettings;
-    s.playbackMode = readIntSetting(key, "CS Playback Mode", defaults.playbackMode);
-    s.noteMode = readIntSetting(key, "CS Note Mode", defaults.noteMode);
-    s.scaleMode = readIntSetting(key, "CS Scale Mode", defaults.scaleMode);
-    s.meterWidth = readIntSetting(key, "CS Meter width", defaults.meterWidth);
-    s.meterHeight = readIntSetting(key, "CS Meter height", defaults.meterHeight);
-    s.meterXOffset = readIntSetting(key, "CS Meter x-offset", defaults.meterXOffset);
-    s.meterYOffset = readIntSetting(key, "CS Meter y-offset", defaults.meterYOffset);
-    s.meterAnchor = uint8_t(readIntSetting(key, "CS Meter anchor", defaults.meterAnchor));
-    s.defaultInstrument = firstCharacters(readTextSetting(key, "CS Default Instrument", defaults.defaultInstrument),
-                                          MAX_DEFAULT_INSTRUMENT_CHARACTERS);
-    s.showSpeedWarning = readBoolSetting(key, "Show CSSpeedWarning dialog", defaults.showSpeedWarning);
-    s.boostSpeed = readBoolSetting(key, "CS Boost speed", defaults.boostSpeed);
-    s.inputWaveQuality = readIntSetting(key, "CS Input wave quality", defaults.inputWaveQuality);
-    openSettingsSection(nullptr, REG_ROOT_MACHINE);
-    return 1;
-}
-
-int saveGeneralSettings() {
-    RegistryKey key = openSettingsSection(GENERAL_SETTINGS_SECTION, REG_ROOT_MACHINE);
-    if (!key) return 0;
-    writeBoolSetting(key, "Splash screen", generalSettings.splashScreen);
-    writeBoolSetting(key, "Quick Prefs", generalSettings.quickPrefs);
-    openSettingsSection(nullptr, REG_ROOT_MACHINE);
-    return 1;
-}
-
-int saveAudioGeneralSettings() {
-    RegistryKey key = openSettingsSection(GENERAL_SETTINGS_SECTION, REG_ROOT_MACHINE);
-    if (!key) return 0;
-    const GeneralSettings& s = generalSettings;
-    writeIntSetting(key, "CS Pitch range", s.pitchRange);
-    writeBoolSetting(key, "CS Enhanced pitch accuracy", s.enhancedPitchAccuracy);
-    writeBoolSetting(key, "CS Detect syllables", s.detectSyllables);
-    writeBoolSetting(key, "CS Disable wave editing", s.disableWaveEditing);
-    writeBoolSetting(key, "CS Draw smooth lines", s.drawSmoothLines);
-    writeBoolSetting(key, "CS Draw transparencies", s.drawTransparencies);
-    writeBoolSetting(key, "CS Draw gradients", s.drawGradients);
-    openSettingsSection(nullptr, REG_ROOT_MACHINE);
-    return 1;
-}
-
-int saveGlobalSettings() {
-    RegistryKey key = openSettingsSection(GLOBAL_SETTINGS_SECTION, REG_ROOT_MACHINE);
-    if (!key) return 0;
-    const GlobalSettings& s = globalSettings;
-    writeBoolSetting(key, "Translucent Windows", s.translucentWindows);
-    writeIntSetting(key, "Open Filter", s.openFilter);
-    writeIntSetting(key, "Save Filter", s.saveFilter);
-    writeTextSetting(key, "Open Directory", s.openDirectory);
-    writeTextSetting(key, "Save Directory", s.saveDirectory);
+static void writePlacementAndRecentFiles(RegistryKey key, const GlobalSettings& s) {
     if (s.hasMainWindowPosition)
         writeBinarySetting(key, "Main window position", s.mainWindowPosition, WINDOW_PLACEMENT_SIZE);
-    int count = s.recentFileCount < 0 ? 0 : s.recentFileCount > MAX_RECENT_FILES ? MAX_RECENT_FILES : s.recentFileCount;
+    int count = clampedRecentFileCount(s.recentFileCount);
     writeIntSetting(key, "Number of recent files", count);
-    for (int i = 0; i < count; i++) {
-        char name[32];
-        std::snprintf(name, sizeof name, "Recent file %d", i);
-        writeTextSetting(key, name, s.recentFiles[i]);
+    for (int i = 0; i < count; i++) writeTextSetting(key, recentFileName(i), s.recentFiles[i]);
+}
+
+// Reads a set of values of section (and, when given, what follows them); a section that
+// cannot be opened ends start-up.
+template <class Record, size_t N>
+static int loadValues(const char* section, const SettingValue<Record> (&values)[N], Record& s,
+                      void (*readMore)(RegistryKey, Record&) = nullptr) {
+    RegistryKey key = openSettingsSection(section, REG_ROOT_MACHINE);
+    if (!key) {
+        quitFlag = 1;
+        return 0;
     }
+    readValues(key, values, s);
+    if (readMore) readMore(key, s);
     openSettingsSection(nullptr, REG_ROOT_MACHINE);
     return 1;
 }
 
-int saveAudioGlobalSettings() {
-    RegistryKey key = openSettingsSection(GLOBAL_SETTINGS_SECTION, REG_ROOT_MACHINE);
+template <class Record, size_t N>
+static int saveValues(const char* section, const SettingValue<Record> (&values)[N], const Record& s,
+                      void (*writeMore)(RegistryKey, const Record&) = nullptr) {
+    RegistryKey key = openSettingsSection(section, REG_ROOT_MACHINE);
     if (!key) return 0;
-    const GlobalSettings& s = globalSettings;
-    writeIntSetting(key, "CS Playback Mode", s.playbackMode);
-    writeIntSetting(key, "CS Note Mode", s.noteMode);
-    writeIntSetting(key, "CS Scale Mode", s.scaleMode);
-    writeIntSetting(key, "CS Meter width", s.meterWidth);
-    writeIntSetting(key, "CS Meter height", s.meterHeight);
-    writeIntSetting(key, "CS Meter x-offset", s.meterXOffset);
-    writeIntSetting(key, "CS Meter y-offset", s.meterYOffset);
-    writeIntSetting(key, "CS Meter anchor", s.meterAnchor);
-    writeTextSetting(key, "CS Default Instrument", firstCharacters(s.defaultInstrument, MAX_DEFAULT_INSTRUMENT_CHARACTERS));
-    writeBoolSetting(key, "Show CSSpeedWarning dialog", s.showSpeedWarning);
-    writeBoolSetting(key, "CS Boost speed", s.boostSpeed);
-    writeIntSetting(key, "CS Input wave quality", s.inputWaveQuality);
+    writeValues(key, values, s);
+    if (writeMore) writeMore(key, s);
     openSettingsSection(nullptr, REG_ROOT_MACHINE);
     return 1;
 }
+
+int loadGeneralSettings() { return loadValues(GENERAL_SETTINGS_SECTION, GENERAL_VALUES, generalSettings); }
+int loadAudioGeneralSettings() { return loadValues(GENERAL_SETTINGS_SECTION, AUDIO_GENERAL_VALUES, generalSettings); }
+int loadGlobalSettings() {
+    return loadValues(GLOBAL_SETTINGS_SECTION, GLOBAL_VALUES, globalSettings, readPlacementAndRecentFiles);
+}
+int loadAudioGlobalSettings() { return loadValues(GLOBAL_SETTINGS_SECTION, AUDIO_GLOBAL_VALUES, globalSettings); }
+
+int saveGeneralSettings() { return saveValues(GENERAL_SETTINGS_SECTION, GENERAL_VALUES, generalSettings); }
+int saveAudioGeneralSettings() { return saveValues(GENERAL_SETTINGS_SECTION, AUDIO_GENERAL_VALUES, generalSettings); }
+int saveGlobalSettings() {
+    return saveValues(GLOBAL_SETTINGS_SECTION, GLOBAL_VALUES, globalSettings, writePlacementAndRecentFiles);
+}
+int saveAudioGlobalSettings() { return saveValues(GLOBAL_SETTINGS_SECTION, AUDIO_GLOBAL_VALUES, globalSettings); }
 
 void resetSettings() {
     closeSettingsKeys();

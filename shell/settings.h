@@ -55,6 +55,7 @@ struct GeneralSettings {
     bool drawGradients = true;              // "CS Draw gradients": song view gradients
     bool splashScreen = true;               // "Splash screen": show the splash window at start
     bool quickPrefs = true;                 // "Quick Prefs": preferences before opening or recording into an empty song
+    bool operator==(const GeneralSettings&) const = default;
 };
 extern GeneralSettings generalSettings;
 
@@ -81,6 +82,7 @@ struct GlobalSettings {
     uint8_t mainWindowPosition[WINDOW_PLACEMENT_SIZE] = {};   // the frame's placement when hasMainWindowPosition
     int recentFileCount = 0;                // "Number of recent files", 0 to MAX_RECENT_FILES
     std::string recentFiles[MAX_RECENT_FILES];   // "Recent file %d", numbered from 0
+    bool operator==(const GlobalSettings&) const = default;
 };
 extern GlobalSettings globalSettings;
 

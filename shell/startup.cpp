@@ -16,6 +16,7 @@
 #include "platform/ui.h"
 #include "playback/playback.h"
 #include "shell/appTimers.h"
+#include "shell/closeSong.h"
 #include "shell/mainFrame.h"
 #include "shell/openQueue.h"
 #include "shell/paths.h"

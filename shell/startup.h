@@ -37,7 +37,6 @@ extern AppState appState;
 // Disk space limits checked at start.
 constexpr int64_t DISK_SPACE_MINIMUM = 1048576;    // below: refuse to start
 constexpr int64_t DISK_SPACE_WARNING = 4194304;    // below: warn and start
-constexpr int64_t DISK_SPACE_UNKNOWN = 2147483648; // figure used when free space is unknown or beyond 32 bits
 
 // Result codes of the disk check.
 enum DiskCheckResult { DISK_SPACE_ENOUGH = 0, DISK_SPACE_LOW = 1, DISK_SPACE_EXHAUSTED = 2 };

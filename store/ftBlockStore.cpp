@@ -3,14 +3,13 @@
 // the file and the buffers before anything is read or allocated for it.
 #include "store/ftBlockStore.h"
 
-#include <atomic>
 #include <cerrno>
 #include <cstring>
 #include <memory>
 #include <new>
-#include <stdexcept>
 #include <string>
 
+#include "platform/allocation.h"
 #include "platform/files.h"
 #include "platform/ui.h"
 #include "resources/strings.h"
@@ -21,26 +20,8 @@
 FTFiles ftFiles;
 FTBlockWindow ftBlockWindow;
 
-static std::atomic<int> allocationFailsAt{0};   // allocations left until the injected failure; 0 = none
-
 static const uint32_t INDEX_HEAD_BYTES = 4;    // the stored count
 static const uint32_t INDEX_ENTRY_BYTES = 8;   // offset and size of one block
-
-void failFTAllocation(int n) { allocationFailsAt = n > 0 ? n : 0; }
-
-// True when this allocation is the one a test asked to fail; errno then reads as for a
-// failed allocation.
-static bool allocationFails() {
-    int left = allocationFailsAt.load();
-    while (left > 0) {
-        if (allocationFailsAt.compare_exchange_weak(left, left - 1)) {
-            if (left != 1) return false;
-            errno = ENOMEM;
-            return true;
-        }
-    }
-    return false;
-}
 
 static int flushReported(FILE* f) {
     if (fileFlush(f) != 0) {
@@ -285,7 +266,7 @@ static int windowBuffers(uint32_t block, FTBlockBuffers* buffers) {
 }
 
 static std::unique_ptr<uint8_t[]> allocContinuousDataBuffer(size_t bytes) {
-    if (allocationFails()) return nullptr;
+    if (!allocationAllowed()) return nullptr;
     return std::unique_ptr<uint8_t[]>(new (std::nothrow) uint8_t[bytes]);
 }
 
@@ -426,20 +407,13 @@ int growFTBlockWindow() {
         w.detectedFrequenciesBuffers.size() >= blocks)
         return 1;
     // All three arrays get their room before any of them grows, so a failure leaves them as they were.
-    int error = 0;
     errno = 0;
-    try {
-        if (allocationFails()) throw std::bad_alloc();
-        w.dataBuffers.reserve(blocks);
-        w.origDataBuffers.reserve(blocks);
-        w.detectedFrequenciesBuffers.reserve(blocks);
-    } catch (const std::bad_alloc&) {
-        error = errno ? errno : ENOMEM;
-    } catch (const std::length_error&) {
-        error = ENOMEM;
-    }
-    if (error) {
-        showMessage(MESSAGE_ERROR, resourceString(10401) + "\n" + std::strerror(error));
+    if (!tryAllocate([&] {
+            w.dataBuffers.reserve(blocks);
+            w.origDataBuffers.reserve(blocks);
+            w.detectedFrequenciesBuffers.reserve(blocks);
+        })) {
+        showMessage(MESSAGE_ERROR, resourceString(10401) + "\n" + std::strerror(errno ? errno : ENOMEM));
         return 0;
     }
     if (w.dataBuffers.size() < blocks) w.dataBuffers.resize(blocks);

@@ -182,6 +182,3 @@ int saveFTBlocks(uint32_t from, uint32_t to);
 // blocks were moved (a file that cannot be truncated afterwards is reported but still gives 1:
 // the index no longer reaches the bytes left behind).
 int removeFTBlocksFromSong(uint32_t first, uint32_t count);
-
-// Tests: the nth allocation of the FT store from now fails (1 = the next); 0 switches it off.
-void failFTAllocation(int n);

@@ -5,7 +5,6 @@
 #include "store/hiresFTBlockStore.h"
 
 #include <algorithm>
-#include <atomic>
 #include <cassert>
 #include <cfloat>
 #include <cmath>
@@ -15,6 +14,7 @@
 #include <new>
 #include <string>
 
+#include "platform/allocation.h"
 #include "platform/files.h"
 #include "platform/ui.h"
 #include "resources/strings.h"
@@ -29,7 +29,6 @@ HiresGeometry hiresGeometry;
 HiresFiles hiresFiles;
 HiresBuffer hiresBuffer;
 
-static std::atomic<int> allocationFailAt{0};   // allocations left until the injected failure; 0 = none
 
 static const char* const WRITE_NO_FILE_TEXT = "File handle not valid so cannot write data - writeHiresFTBlock (1)";
 static const char* const WRITE_NOT_IN_MEMORY_TEXT =
@@ -60,25 +59,15 @@ static const char* const TEMPORARY_FILE_NAME = "CS.tw";
 
 // ---- allocation ----
 
-static bool allocationRefused() {
-    int left = allocationFailAt.load();
-    while (left > 0) {
-        if (allocationFailAt.compare_exchange_weak(left, left - 1)) return left == 1;
-    }
-    return false;
-}
-
-void failHiresAllocation(int n) { allocationFailAt = n > 0 ? n : 0; }
-
 template <typename T>
 static T* allocateArray(uint32_t count) {
-    if (allocationRefused()) return nullptr;
+    if (!allocationAllowed()) return nullptr;
     return new (std::nothrow) T[count == 0 ? 1 : count];
 }
 
 CompressedHiresBuffer* allocCompressedHiresBuffer(uint32_t capacity) {
     if (capacity == 0) capacity = hiresGeometry.bins;
-    CompressedHiresBuffer* buffer = allocationRefused() ? nullptr : new (std::nothrow) CompressedHiresBuffer{};
+    CompressedHiresBuffer* buffer = allocationAllowed() ? new (std::nothrow) CompressedHiresBuffer{} : nullptr;
     if (!buffer) {
         showMessage(MESSAGE_ERROR, ALLOC_RECORD_TEXT);
         return nullptr;
@@ -118,7 +107,7 @@ int allocHiresBuffer() {
     // calloc: the pages of a buffer this large are zeroed lazily by the system, so blocks
     // never read come out silent, and a request too large fails here instead of throwing.
     double* bytes = nullptr;
-    if (!allocationRefused() && pairs <= SIZE_MAX / (2 * sizeof(double)))
+    if (allocationAllowed() && pairs <= SIZE_MAX / (2 * sizeof(double)))
         bytes = static_cast<double*>(std::calloc(pairs * 2, sizeof(double)));
     if (!bytes) {
         showMessage(MESSAGE_ERROR, HIRES_BUFFER_TEXT);

@@ -118,7 +118,3 @@ int writeHiresFTBlocks(FILE* ftFile, FILE* indexFile, uint32_t from, uint32_t to
 // (a damaged index entry or block, no "CS.tw"); "CS.tw" never stays behind. The song's block
 // count is left to the caller.
 int removeHiresFTBlocksFromSong(uint32_t first, uint32_t count);
-
-// Failure injection for tests: the nth allocation this store makes from now fails (1 = the
-// next one); 0 switches it off.
-void failHiresAllocation(int n);

@@ -1,10 +1,11 @@
-// The song record and its time axis. Block durations start at the nominal duration and are
-// changed per block by timing edits, so the time of a block is always a sum of durations.
+// The song record, its time axis and its names. Block durations start at the nominal duration
+// and are changed per block by timing edits, so the time of a block is always a sum of durations.
 #include "store/song.h"
 
 #include <cmath>
-#include <new>
-#include <stdexcept>
+
+#include "platform/allocation.h"
+#include "shell/settings.h"
 
 Song song;
 
@@ -17,6 +18,7 @@ void resetSong() {
     std::vector<double>().swap(song.sampleBlockDurations);
     song.waveFormat = SongWaveFormat{};
     song.workingWaveBytes = 0;
+    song.instrumentName.clear();
 }
 
 int growSampleBlockDurations(uint32_t blocks) {
@@ -26,14 +28,7 @@ int growSampleBlockDurations(uint32_t blocks) {
     if (song.sampleBlockDuration > 0.0) step = uint32_t(300.0 / song.sampleBlockDuration);
     if (step == 0) step = 1;
     size_t steps = (blocks - length + step - 1) / step;
-    try {
-        song.sampleBlockDurations.resize(length + steps * step, 0.0);
-    } catch (const std::bad_alloc&) {
-        return 0;
-    } catch (const std::length_error&) {
-        return 0;
-    }
-    return 1;
+    return tryResize(song.sampleBlockDurations, length + steps * step, 0.0) ? 1 : 0;
 }
 
 double songTimeOfBlock(uint32_t n, uint32_t from) {
@@ -81,3 +76,18 @@ double snapTimeToBlock(double t, uint32_t startBlock, double startTime) {
 }
 
 double songDuration() { return songTimeOfBlock(song.blockCount); }
+
+SongNames songNames;
+
+void resetSongNames() { songNames = SongNames{}; }
+
+void setSongNamesFromFile(const std::string& path) {
+    std::string name = path;
+    size_t dot = name.rfind('.');
+    if (dot != std::string::npos && dot + 4 >= name.size()) name.erase(dot);
+    for (std::string& remembered : songNames.remembered) remembered = name;
+}
+
+std::string songInstrumentName() {
+    return song.instrumentName.empty() ? globalSettings.defaultInstrument : song.instrumentName;
+}

@@ -5,6 +5,7 @@
 // below, because timing edits make block durations unequal.
 
 #include <cstdint>
+#include <string>
 #include <vector>
 
 // The song's copy of the first 16 bytes of a wave format record.
@@ -25,10 +26,11 @@ struct Song {
                                                 // entries past blockCount are 0; timing edits change them
     SongWaveFormat waveFormat;                  // format of CS.fw's source (set by acceptWaveFormat)
     uint32_t workingWaveBytes;                  // data bytes stored in CS.fw so far
+    std::string instrumentName;                 // the song's instrument; "" until the song sets it
 };
 extern Song song;
 
-// Empties the song's memory: no blocks, no durations, format cleared.
+// Empties the song's memory: no blocks, no durations, format and instrument cleared.
 void resetSong();
 
 // Makes room in sampleBlockDurations for at least blocks entries, growing in steps of
@@ -50,3 +52,23 @@ uint32_t blockAtTime(double t, uint32_t startBlock = 0, double startTime = 0.0, 
 double snapTimeToBlock(double t, uint32_t startBlock = 0, double startTime = 0.0);
 // The song's duration in seconds: songTimeOfBlock(blockCount).
 double songDuration();
+
+// ---- the song's names ----
+// For each output Save can write (a wave, a MIDI or a detail MIDI file, OutputType of the
+// Save command) the name to propose and the name it was last written under.
+struct SongNames {
+    std::string remembered[3];   // per output: the name proposed (opening, saving)
+    std::string lastSaved[3];    // per output: the name last written under (saving)
+};
+extern SongNames songNames;
+
+// Clears the six names (start-up, song close).
+void resetSongNames();
+// A new song takes the file's name without its extension as each remembered name: the last
+// "." within the last four characters and what follows are cut.
+void setSongNamesFromFile(const std::string& path);
+
+// The song's instrument: the name the MIDI tracks carry and take their General MIDI program
+// from, which recognition fits to the instrument definitions. "CS Default Instrument" until
+// the song sets instrumentName.
+std::string songInstrumentName();

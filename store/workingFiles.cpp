@@ -4,9 +4,6 @@
 
 #include <mutex>
 
-#include "analysis/noteRecognition.h"
-#include "notes/noteList.h"
-#include "notes/selection.h"
 #include "platform/sync.h"
 #include "shell/paths.h"
 #include "store/fileRoutines.h"
@@ -41,7 +38,7 @@ int closeFTStore() {
     return deleted;
 }
 
-int closeSong() {
+int closeSongStores() {
     waitForUndoSnapshotWriter();
     int closed = 1;
     {
@@ -51,10 +48,7 @@ int closeSong() {
     if (!closeFTStore()) closed = 0;
     freeHiresBuffers();
     resetSong();
-    resetNoteList();
-    resetNoteRecognition();   // the next song settles its own instruments and voice
     if (!emptyUndoFolder()) closed = 0;
     if (!deleteWorkingFiles()) closed = 0;
-    resetSelection();
     return closed;
 }

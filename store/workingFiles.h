@@ -1,6 +1,6 @@
 #pragma once
 // The song's working files in the shared folder: their names, their removal at start-up and
-// when the song closes.
+// when the song closes, and the emptying of the song's stores.
 
 // Working files removed by deleteWorkingFiles, in this order.
 extern const char* const WORKING_FILE_NAMES[11];
@@ -11,7 +11,8 @@ int deleteWorkingFiles();
 // Empties the FT store: no blocks, an empty window with its arrays freed, and CS.ft/CS.fi
 // (CS.ft+/CS.fi+) deleted unless they are open. 1 when nothing failed to be deleted.
 int closeFTStore();
-// Closes the song: waits for the undo snapshot writer, deletes CS.fw holding
-// CSAccessWaveFileMutex, frees the time axis, empties the undo folder and deletes the
-// remaining working files. 1 when everything was removed.
-int closeSong();
+// Empties the song's stores: waits for the undo snapshot writer, deletes CS.fw holding
+// CSAccessWaveFileMutex, empties the FT store and the Hires buffers, resets the song record
+// and its time axis, empties the undo folder and deletes the remaining working files. 1 when
+// everything was removed. Closing the song (shell/closeSong.h) also empties its notes.
+int closeSongStores();

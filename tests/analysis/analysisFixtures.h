@@ -17,6 +17,7 @@
 #include "analysis/recognitionOptions.h"
 #include "analysis/spectrogram.h"
 #include "analysis/signalGenerator.h"
+#include "platform/allocation.h"
 #include "platform/ui.h"
 #include "shell/settings.h"
 #include "store/ftBlockStore.h"
@@ -39,8 +40,7 @@ inline void emptyAnalysisState() {
     resetSong();
     resetSettings();
     resetRecognitionOptions();
-    failAnalysisAllocation(0);
-    failSpectrogramAllocation(0);
+    failAllocation(0);
     clearUiCalls();
 }
 

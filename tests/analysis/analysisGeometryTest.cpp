@@ -3,6 +3,9 @@
 // floor; the nine-level limit with its message; and the options each pitch range sets.
 #include <gtest/gtest.h>
 
+#include <tuple>
+#include <utility>
+
 #include "analysis/analysisFixtures.h"
 #include "analysis/analysisGeometry.h"
 #include "analysis/pitchScale.h"
@@ -27,102 +30,76 @@ protected:
 
 TEST_F(AnalysisGeometrySetup, LowToMidRangeAt44100HzHasBlocksOf512SamplesAndSixLevels) {
     AnalysisGeometry g = geometryFor(PITCH_RANGE_LOW_TO_MID, false, false);
-    EXPECT_EQ(g.blockSamples, 512u);
     EXPECT_DOUBLE_EQ(g.sampleBlockDuration, 512.0 / 44100.0);
     EXPECT_DOUBLE_EQ(song.sampleBlockDuration, 512.0 / 44100.0);
     EXPECT_NEAR(g.binSpacing, 43.07, HZ_TOLERANCE);
-    EXPECT_EQ(g.levels, 6);
-    EXPECT_EQ(g.group, 32u);
-    EXPECT_EQ(g.topFrame, 16384u);
-    EXPECT_EQ(g.hiresBins, 16384u);
-    EXPECT_EQ(g.windowCapacity, 2583u) << "30 s of 512-sample blocks";
-    EXPECT_EQ(ftBlockWindow.capacity, 2583u);
-    EXPECT_EQ(g.blocksPerSecond, 96u) << "86 blocks rounded up to a multiple of 32";
-    EXPECT_EQ(g.chunkBlocks, 32u) << "with no buffer in view a chunk is one group";
-    EXPECT_EQ(g.lookaheadSamples, 8192u);
+    // A window of 30 s of 512-sample blocks; 86 blocks a second rounded up to a multiple of 32;
+    // with no buffer in view a chunk is one group.
+    EXPECT_EQ(std::tuple(g.blockSamples, g.levels, g.group, g.topFrame, g.hiresBins, g.windowCapacity, ftBlockWindow.capacity),
+              std::tuple(512u, 6, 32u, 16384u, 16384u, 2583u, 2583u));
+    EXPECT_EQ(std::tuple(g.blocksPerSecond, g.chunkBlocks, g.lookaheadSamples, g.firstPitchIndex, g.pitchBins),
+              std::tuple(96u, 32u, 8192u, 64, 68));
     EXPECT_DOUBLE_EQ(g.lowestAnalysed, 41.3f);
     EXPECT_DOUBLE_EQ(g.highestAnalysed, 2155.2f);
-    EXPECT_EQ(g.firstPitchIndex, 64);
-    EXPECT_EQ(g.pitchBins, 68);
     EXPECT_EQ(g.noiseFloor, 123695058.0) << "512 x (32768 x 0.015)^2";
-    EXPECT_EQ(magnitudeSpectrogram.binsPerRow, 2048u);
-    EXPECT_EQ(magnitudeSpectrogram.hop, 256u);
-    EXPECT_EQ(hiresGeometry.bins, 16384u);
+    EXPECT_EQ(std::tuple(magnitudeSpectrogram.binsPerRow, magnitudeSpectrogram.hop, hiresGeometry.bins), std::tuple(2048u, 256u, 16384u));
     EXPECT_NEAR(hiresGeometry.lowestFrequency, 43.07, HZ_TOLERANCE);
-    EXPECT_EQ(hiresGeometry.binsPerStep, 32.0);
-    EXPECT_EQ(hiresGeometry.hopFraction, 0.03125);
+    EXPECT_EQ(std::pair(hiresGeometry.binsPerStep, hiresGeometry.hopFraction), std::pair(32.0, 0.03125));
     EXPECT_EQ(messageCount(), 0);
 }
 
-TEST_F(AnalysisGeometrySetup, EnhancedAccuracyHalvesThePitchStepAndAddsALevel) {
+// Enhanced accuracy halves the pitch step and adds a level; the mid-to-high range has blocks
+// of 256 samples, the very low range of 1024; boost lengthens the blocks and needs fewer levels.
+// 0: not checked for that row.
+TEST_F(AnalysisGeometrySetup, EachRangeAndOptionGivesItsBlocksLevelsAndGrid) {
+    struct Row {
+        int range;
+        bool enhanced, boost;
+        uint32_t blockSamples;
+        int levels;
+        uint32_t group, blocksPerSecond, chunkBlocks, windowCapacity;
+        int pitchBins;
+    };
+    const Row rows[] = {
+        {PITCH_RANGE_LOW_TO_MID, true, false, 512, 7, 64, 128, 64, 0, 137},
+        {PITCH_RANGE_MID_TO_HIGH, false, false, 256, 6, 32, 192, 0, 5167, 68},   // six levels resolve 82.5 Hz with 86 Hz bins
+        {PITCH_RANGE_MID_TO_HIGH, true, false, 256, 7, 0, 0, 0, 0, 0},
+        {PITCH_RANGE_VERY_LOW, false, false, 1024, 6, 32, 64, 0, 1291, 0},
+        {PITCH_RANGE_VERY_LOW, true, false, 1024, 7, 0, 0, 0, 0, 0},
+        {PITCH_RANGE_MID_TO_HIGH, false, true, 1024, 4, 8, 0, 0, 0, 0},
+        {PITCH_RANGE_MID_TO_HIGH, true, true, 1024, 5, 0, 0, 0, 0, 0},
+        {PITCH_RANGE_LOW_TO_MID, false, true, 1024, 5, 0, 0, 0, 0, 0},
+        {PITCH_RANGE_VERY_LOW, false, true, 2048, 5, 0, 0, 0, 0, 0},
+    };
+    for (const Row& r : rows) {
+        AnalysisGeometry g = geometryFor(r.range, r.enhanced, r.boost);
+        SCOPED_TRACE(testing::Message() << "range " << r.range << " enhanced " << r.enhanced << " boost " << r.boost);
+        EXPECT_EQ(std::tuple(g.blockSamples, g.levels), std::tuple(r.blockSamples, r.levels));
+        EXPECT_DOUBLE_EQ(g.sampleBlockDuration, r.blockSamples / 44100.0);
+        EXPECT_NEAR(g.binSpacing, 44100.0 / (2 * r.blockSamples), HZ_TOLERANCE);
+        const std::pair<uint32_t, uint32_t> checked[] = {{r.group, g.group}, {r.blocksPerSecond, g.blocksPerSecond},
+                                                         {r.chunkBlocks, g.chunkBlocks}, {r.windowCapacity, g.windowCapacity},
+                                                         {uint32_t(r.pitchBins), uint32_t(g.pitchBins)}};
+        for (auto [expected, actual] : checked)
+            if (expected) EXPECT_EQ(actual, expected);
+    }
     AnalysisGeometry g = geometryFor(PITCH_RANGE_LOW_TO_MID, true, false);
-    EXPECT_EQ(g.blockSamples, 512u);
-    EXPECT_EQ(g.levels, 7);
-    EXPECT_EQ(g.group, 64u);
     EXPECT_EQ(g.hiresBins, 32768u);
-    EXPECT_EQ(g.blocksPerSecond, 128u);
-    EXPECT_EQ(g.chunkBlocks, 64u);
     EXPECT_NEAR(g.pitchStep, 0.0250858 / 2, 1e-7);
-    EXPECT_EQ(g.pitchBins, 137);
-}
-
-TEST_F(AnalysisGeometrySetup, MidToHighRangeHasBlocksOf256SamplesAndSixOrSevenLevels) {
-    AnalysisGeometry g = geometryFor(PITCH_RANGE_MID_TO_HIGH, false, false);
-    EXPECT_EQ(g.blockSamples, 256u);
-    EXPECT_DOUBLE_EQ(g.sampleBlockDuration, 256.0 / 44100.0);
-    EXPECT_NEAR(g.binSpacing, 86.13, HZ_TOLERANCE);
-    EXPECT_EQ(g.levels, 6) << "six levels resolve 82.5 Hz with 86 Hz bins";
-    EXPECT_EQ(g.group, 32u);
-    EXPECT_EQ(g.windowCapacity, 5167u);
-    EXPECT_EQ(g.blocksPerSecond, 192u);
-    EXPECT_EQ(g.pitchBins, 68);
+    g = geometryFor(PITCH_RANGE_MID_TO_HIGH, false, false);
     EXPECT_DOUBLE_EQ(g.highestAnalysed, 4310.0);
-    EXPECT_EQ(magnitudeSpectrogram.binsPerRow, 2048u);
-    EXPECT_EQ(magnitudeSpectrogram.hop, 256u);
-    EXPECT_EQ(geometryFor(PITCH_RANGE_MID_TO_HIGH, true, false).levels, 7);
+    EXPECT_EQ(std::pair(magnitudeSpectrogram.binsPerRow, magnitudeSpectrogram.hop), std::pair(2048u, 256u));
+    EXPECT_EQ(geometryFor(PITCH_RANGE_VERY_LOW, false, false).noiseFloor, 247390116.0);
 }
 
-TEST_F(AnalysisGeometrySetup, VeryLowRangeHasBlocksOf1024SamplesAndSixOrSevenLevels) {
-    AnalysisGeometry g = geometryFor(PITCH_RANGE_VERY_LOW, false, false);
-    EXPECT_EQ(g.blockSamples, 1024u);
-    EXPECT_NEAR(g.binSpacing, 21.53, HZ_TOLERANCE);
-    EXPECT_EQ(g.levels, 6);
-    EXPECT_EQ(g.group, 32u);
-    EXPECT_EQ(g.windowCapacity, 1291u);
-    EXPECT_EQ(g.blocksPerSecond, 64u);
-    EXPECT_EQ(g.noiseFloor, 247390116.0);
-    EXPECT_EQ(geometryFor(PITCH_RANGE_VERY_LOW, true, false).levels, 7);
-}
-
-TEST_F(AnalysisGeometrySetup, BoostSpeedLengthensTheBlocksAndNeedsFewerLevels) {
-    AnalysisGeometry g = geometryFor(PITCH_RANGE_MID_TO_HIGH, false, true);
-    EXPECT_EQ(g.blockSamples, 1024u);
-    EXPECT_EQ(g.levels, 4);
-    EXPECT_EQ(g.group, 8u);
-    EXPECT_EQ(geometryFor(PITCH_RANGE_MID_TO_HIGH, true, true).levels, 5);
-    g = geometryFor(PITCH_RANGE_LOW_TO_MID, false, true);
-    EXPECT_EQ(g.blockSamples, 1024u);
-    EXPECT_EQ(g.levels, 5);
-    g = geometryFor(PITCH_RANGE_VERY_LOW, false, true);
-    EXPECT_EQ(g.blockSamples, 2048u);
-    EXPECT_DOUBLE_EQ(g.sampleBlockDuration, 2048.0 / 44100.0);
-    EXPECT_EQ(g.levels, 5);
-}
-
-TEST_F(AnalysisGeometrySetup, EightBitSongsHaveAScaledNoiseFloor) {
-    EXPECT_EQ(geometryFor(PITCH_RANGE_LOW_TO_MID, false, false, 44100, 8).noiseFloor, 1887.0);
-}
-
-TEST_F(AnalysisGeometrySetup, SlowRatesGetTheirOwnBlocksAndAnAnalysedRangeCutAtHalfTheRate) {
+TEST_F(AnalysisGeometrySetup, SlowRatesAndEightBitSongsAndADamagedRangeSettingGetTheirOwnGeometry) {
+    EXPECT_EQ(geometryFor(PITCH_RANGE_LOW_TO_MID, false, false, 44100, 8).noiseFloor, 1887.0) << "a scaled noise floor";
     AnalysisGeometry g = geometryFor(PITCH_RANGE_MID_TO_HIGH, false, false, 8000);
     EXPECT_EQ(g.blockSamples, 32u) << "trunc(8000 / 128) + 1 = 63";
     EXPECT_DOUBLE_EQ(g.highestAnalysed, 4000.0);
     EXPECT_EQ(magnitudeSpectrogram.binsPerRow, 512u);
     EXPECT_EQ(magnitudeSpectrogram.hop, 64u);
-}
-
-TEST_F(AnalysisGeometrySetup, ADamagedPitchRangeSettingIsTakenAsTheDefaultRange) {
-    AnalysisGeometry g = geometryFor(7, false, false);
+    g = geometryFor(7, false, false);   // a damaged pitch range setting is the default range
     EXPECT_EQ(g.blockSamples, 512u);
     EXPECT_FLOAT_EQ(recognitionOptions.lowestFrequency, 41.3f);
 }
@@ -153,18 +130,16 @@ TEST_F(AnalysisGeometrySetup, DisablingWaveEditingDropsThePhasesAndCombinesOnlyU
     EXPECT_FALSE(frequencyAnalysis.levelPhases.empty());
 }
 
-TEST_F(AnalysisGeometrySetup, ASongWithoutAUsableFormatIsNotSetUp) {
+TEST_F(AnalysisGeometrySetup, ASongWithoutAUsableFormatOrMemoryIsNotSetUp) {
     setSongFormat(0, 16);
     EXPECT_EQ(setupFrequencyAnalysis(), 0);
     setSongFormat(44100, 24);
     EXPECT_EQ(setupFrequencyAnalysis(), 0);
     EXPECT_EQ(analysisBuffersReady(), 0);
     EXPECT_EQ(createFrequencyTable(0), -1);
-}
-
-TEST_F(AnalysisGeometrySetup, WorkingBuffersThatCannotBeHadAreAllReleasedAfterTheMemoryMessage) {
+    // Working buffers that cannot be had are all released after the memory message.
     setSongFormat(44100, 16);
-    failAnalysisAllocation(5);
+    failAllocation(5);
     EXPECT_EQ(setupFrequencyAnalysis(), 0);
     EXPECT_EQ(lastMessageText(),
               "Sorry - there is insufficient memory available to continue. Please try freeing up some memory from "
@@ -188,7 +163,7 @@ TEST(AnalysisGeometry, ChunksGrowWithTheBufferInWholeGroupsAndStayWithinTheWindo
     EXPECT_EQ(chunkBlockCount(g, 44100 * 600), 2560u) << "at most the window, in whole groups";
 }
 
-TEST(AnalysisGeometry, LevelsStopAtNineWithTheirMessage) {
+TEST(AnalysisGeometry, LevelsStopAtNineWithTheirMessageAndARangeNeedsAPitchGrid) {
     RecognitionOptions options;
     options.blockDuration = 1.0f / 128;
     options.lowestFrequency = 10.0f;
@@ -203,11 +178,8 @@ TEST(AnalysisGeometry, LevelsStopAtNineWithTheirMessage) {
     ASSERT_EQ(deriveAnalysisGeometry(44100, 16, options, 0, &g, &capped), 1);
     EXPECT_EQ(g.levels, 6);
     EXPECT_FALSE(capped);
-}
-
-TEST(AnalysisGeometry, ARangeWithoutAPitchGridIsRefused) {
-    RecognitionOptions options;
-    AnalysisGeometry g{};
+    // A range without a pitch grid is refused and the geometry left untouched.
+    g = AnalysisGeometry{};
     options.lowestFrequency = 0.0f;
     EXPECT_EQ(deriveAnalysisGeometry(44100, 16, options, 0, &g), 0);
     options.lowestFrequency = 500.0f;

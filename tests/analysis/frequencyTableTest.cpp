@@ -56,12 +56,11 @@ protected:
     }
 };
 
-TEST_F(FrequencyTableTest, SteadySinesLandInTheirPitchBinWithinTenCents) {
-    for (double f : {110.0, 220.0, 440.0, 880.0}) expectToneAt(f, {1.0});
-}
-
-TEST_F(FrequencyTableTest, HarmonicTonesAreFoundAtTheirFundamental) {
-    for (double f : {110.0, 220.0, 440.0, 880.0}) expectToneAt(f, {1.0, 0.6, 0.4, 0.25});
+TEST_F(FrequencyTableTest, SteadySinesAndHarmonicTonesLandInTheirFundamentalsPitchBinWithinTenCents) {
+    for (double f : {110.0, 220.0, 440.0, 880.0}) {
+        expectToneAt(f, {1.0});
+        expectToneAt(f, {1.0, 0.6, 0.4, 0.25});
+    }
 }
 
 TEST_F(FrequencyTableTest, EntriesCarryTheirBinsFrequencyWidthLevelAndTheChunksCutOff) {
@@ -92,7 +91,7 @@ TEST_F(FrequencyTableTest, EntriesCarryTheirBinsFrequencyWidthLevelAndTheChunksC
     }
 }
 
-TEST_F(FrequencyTableTest, SilenceGivesEmptyBlocksThatAreStillAppendedAndTimed) {
+TEST_F(FrequencyTableTest, SilenceAndSoundBelowTheNoiseFloorGiveEmptyBlocksThatAreStillAppendedAndTimed) {
     std::vector<AnalysedBlock> blocks = analyse(silenceSignal(1.0, RATE));
     ASSERT_EQ(blocks.size(), 86u);
     for (const AnalysedBlock& b : blocks) {
@@ -105,14 +104,13 @@ TEST_F(FrequencyTableTest, SilenceGivesEmptyBlocksThatAreStillAppendedAndTimed) 
     EXPECT_EQ(ftBlockWindow.endBlock, 86u);
     for (uint32_t b = 0; b < 86; b++) EXPECT_DOUBLE_EQ(blockDuration(b), BLOCK_SECONDS);
     EXPECT_NEAR(songDuration(), 86 * BLOCK_SECONDS, 1e-9);
-}
-
-TEST_F(FrequencyTableTest, SoundBelowTheNoiseFloorGivesNoEntriesAndNoLoudness) {
-    // Noise peaking at 150 (RMS about 87, far below 1.5 % of full scale) with a faint tone.
+    // Sound below the noise floor, noise peaking at 150 (RMS about 87, far below 1.5 % of full
+    // scale) with a faint tone, gives no entries and no loudness either.
     std::vector<double> x = noiseSignal(150.0, 1.0, RATE);
     std::vector<double> tone = toneSignal(330.0, 100.0, 1.0, RATE);
     for (size_t i = 0; i < x.size(); i++) x[i] += tone[i];
-    std::vector<AnalysedBlock> blocks = analyse(x);
+    emptyAnalysisState();
+    blocks = analyse(x);
     ASSERT_EQ(blocks.size(), 86u);
     for (const AnalysedBlock& b : blocks) {
         EXPECT_EQ(b.data.nEntries, 0u);
@@ -214,9 +212,8 @@ TEST_F(FrequencyTableTest, EachCallReturnsWhereTheNextChunkStarts) {
     EXPECT_EQ(createFrequencyTable(16384), 32768);
     EXPECT_EQ(createFrequencyTable(32768 + 200), 32768 + 16384) << "a start inside a block begins at its nearest boundary";
     EXPECT_EQ(song.blockCount, 96u);
-}
-
-TEST_F(FrequencyTableTest, TheSongsLastPartialBlockIsNotAnalysed) {
+    // The song's last partial block is not analysed.
+    emptyAnalysisState();
     std::vector<AnalysedBlock> blocks = analyse(toneSignal(220.0, 8000.0, 1.0 + 300.0 / RATE, RATE));
     EXPECT_EQ(blocks.size(), 86u) << "44400 samples hold 86 whole blocks of 512";
     EXPECT_EQ(song.blockCount, 86u);
@@ -227,9 +224,9 @@ TEST_F(FrequencyTableTest, WindowArraysThatCannotBeHadOnTheFirstChunkGiveTheMemo
     bytes = toSampleBytes(silenceSignal(1.0, RATE), 16);
     ASSERT_EQ(setupFrequencyAnalysis(), 1);
     setAnalysisSampleBuffer(bytes.data(), 44100, 0);
-    failFTAllocation(1);
+    failAllocation(1);
     EXPECT_EQ(createFrequencyTable(0), -1);
-    failFTAllocation(0);
+    failAllocation(0);
     EXPECT_EQ(lastMessageText().rfind("Sorry - there is insufficient memory available to continue.", 0), 0u);
     EXPECT_EQ(song.blockCount, 0u);
 }

@@ -6,27 +6,27 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
-#include <filesystem>
 #include <string>
 #include <vector>
 
 #include "analysis/instrumentDefinitions.h"
 #include "analysis/recognitionOptions.h"
+#include "platform/allocation.h"
 #include "platform/files.h"
 #include "platform/ui.h"
 #include "resources/generalMidi.h"
+#include "shell/closeSong.h"
 #include "shell/paths.h"
 #include "shell/settings.h"
 #include "store/song.h"
-#include "store/workingFiles.h"
 #include "support/testSupport.h"
 
 using Bytes = std::vector<uint8_t>;
 
-class InstrumentTest : public ::testing::Test {
+class InstrumentTest : public SharedFolderTest {
 protected:
     void SetUp() override {
-        savedPaths = paths;
+        SharedFolderTest::SetUp();
         useTestFolders(folder);
         // The General MIDI list and the delivered definitions of this source tree.
         paths.resourcePath = sourceRoot();
@@ -35,27 +35,18 @@ protected:
         resetRecognitionOptions();
         setInstrumentDefinitionsFile(definitionsPath());
         freeInstrumentDefinitions();
-        failInstrumentAllocation(0);
-        clearFileFailures();
-        clearUiCalls();
     }
     void TearDown() override {
         freeInstrumentDefinitions();
         setInstrumentDefinitionsFile("");
-        failInstrumentAllocation(0);
         clearFileFailures();
+        failAllocation(0);
         closeSong();
         resetRecognitionOptions();
         resetGeneralMidiTable();
-        paths = savedPaths;
-    }
-    static std::string sourceRoot() {
-        return std::filesystem::path(__FILE__).parent_path().parent_path().parent_path().string() + "/";
+        SharedFolderTest::TearDown();
     }
     std::string definitionsPath() const { return folder.file("CSInst.dat"); }
-
-    TempFolder folder;
-    Paths savedPaths;
 };
 
 inline void putFloat(Bytes& b, float v) {

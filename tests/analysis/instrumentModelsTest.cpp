@@ -7,6 +7,7 @@
 #include <cmath>
 #include <limits>
 #include <string>
+#include <tuple>
 
 #include "analysis/instrumentFixtures.h"
 #include "analysis/instrumentModels.h"
@@ -22,18 +23,13 @@ protected:
 
 TEST_F(InstrumentModels, ABassGuitarGetsFiveShapedHarmonicsPerSample) {
     InstrumentDefinition d = generated("Bass Guitar", 40, 41, 2.0, 200);
-    EXPECT_EQ(d.kind, "Synthesised");
-    EXPECT_EQ(d.source, "Generated");
-    EXPECT_EQ(d.midiVoice, 33);
-    EXPECT_EQ(d.maxNotesInChord, 4);
-    EXPECT_EQ(d.middleA, 440.0f);
+    EXPECT_EQ(std::tuple(d.kind, d.source, d.midiVoice, d.maxNotesInChord, d.middleA),
+              std::tuple("Synthesised", "Generated", 33, 4, 440.0f));
     ASSERT_EQ(d.semitones.size(), 2u);
     const NoteSampleSet& e2 = d.semitones[0];
     ASSERT_EQ(e2.sampleCount, 2);
-    EXPECT_EQ(e2.samples[0].duration, 1.0f);
-    EXPECT_EQ(e2.samples[1].duration, 2.0f);
-    EXPECT_EQ(e2.samples[0].level, 100u);
-    EXPECT_EQ(e2.samples[1].level, 200u);
+    EXPECT_EQ(std::tuple(e2.samples[0].duration, e2.samples[1].duration, e2.samples[0].level, e2.samples[1].level),
+              std::tuple(1.0f, 2.0f, 100u, 200u));
     for (int k = 0; k < 2; k++) EXPECT_EQ(e2.samples[k].harmonicCount, 5) << k;
     EXPECT_EQ(d.semitones[1].samples[1].harmonicCount, 5);
 
@@ -46,14 +42,11 @@ TEST_F(InstrumentModels, ABassGuitarGetsFiveShapedHarmonicsPerSample) {
     for (int k = 0; k < 5; k++) {
         EXPECT_NEAR(h[k].frequency, frequencies[k], 1e-3) << k;
         EXPECT_NEAR(h[k].noteFrequency, notes[k], 1e-3) << k;
-        EXPECT_EQ(h[k].meanAmplitude, means[k]) << k;
-        EXPECT_EQ(h[k].startPosition, 0) << k;
-        EXPECT_EQ(h[k].endPosition, 255) << k;
-        EXPECT_EQ(h[k].toleranceMeasures[0], 31) << k;
-        EXPECT_EQ(h[k].toleranceMeasures[1], 5) << k;
-        EXPECT_EQ(h[k].onsetShape, shapes[k][0]) << k;
-        EXPECT_EQ(h[k].sustainShape, shapes[k][1]) << k;
-        EXPECT_EQ(h[k].decayShape, shapes[k][2]) << k;
+        EXPECT_EQ(std::tuple(h[k].meanAmplitude, h[k].startPosition, h[k].endPosition, h[k].toleranceMeasures[0],
+                             h[k].toleranceMeasures[1]),
+                  std::tuple(means[k], 0, 255, 31, 5)) << k;
+        EXPECT_EQ(std::tuple(h[k].onsetShape, h[k].sustainShape, h[k].decayShape),
+                  std::tuple(shapes[k][0], shapes[k][1], shapes[k][2])) << k;
     }
     const uint32_t halfMeans[5] = {100, 37, 37, 18, 18};
     for (int k = 0; k < 5; k++) EXPECT_EQ(e2.samples[0].harmonics[k].meanAmplitude, halfMeans[k]) << k;
@@ -61,27 +54,18 @@ TEST_F(InstrumentModels, ABassGuitarGetsFiveShapedHarmonicsPerSample) {
 
 TEST_F(InstrumentModels, APianoGetsOneSineHarmonicPerSample) {
     InstrumentDefinition d = generated("Piano", 69, 70, 1.0, 101);
-    EXPECT_EQ(d.kind, "Sine");
-    EXPECT_EQ(d.midiVoice, 0);
-    EXPECT_EQ(d.maxNotesInChord, 12);
-    EXPECT_EQ(d.scoreThresholds[0], 70.0f);
-    EXPECT_EQ(d.scoreThresholds[1], 30.0f);
-    EXPECT_EQ(d.scoreThresholds[2], 10.0f);
+    EXPECT_EQ(std::tuple(d.kind, d.midiVoice, d.maxNotesInChord, d.scoreThresholds[0], d.scoreThresholds[1], d.scoreThresholds[2]),
+              std::tuple("Sine", 0, 12, 70.0f, 30.0f, 10.0f));
     const NoteSampleSet& a4 = d.semitones[0];
     ASSERT_EQ(a4.sampleCount, 2);
-    EXPECT_EQ(a4.samples[0].duration, 0.5f);
-    EXPECT_EQ(a4.samples[0].level, 50u);   // (1 x 101) / 2
-    EXPECT_EQ(a4.samples[1].level, 101u);
+    // The shorter sample's level is (1 x 101) / 2.
+    EXPECT_EQ(std::tuple(a4.samples[0].duration, a4.samples[0].level, a4.samples[1].level), std::tuple(0.5f, 50u, 101u));
     for (int k = 0; k < 2; k++) {
         ASSERT_EQ(a4.samples[k].harmonicCount, 1) << k;
         const Harmonic& h = a4.samples[k].harmonics[0];
-        EXPECT_EQ(h.frequency, 440.0f);
-        EXPECT_EQ(h.noteFrequency, 440.0f);
-        EXPECT_EQ(h.meanAmplitude, a4.samples[k].level);
-        EXPECT_EQ(h.startPosition, 0);
-        EXPECT_EQ(h.endPosition, 255);
-        EXPECT_EQ(h.toleranceMeasures[0], 14);
-        EXPECT_EQ(h.toleranceMeasures[1], 0);
+        EXPECT_EQ(std::tuple(h.frequency, h.noteFrequency, h.meanAmplitude, h.startPosition, h.endPosition,
+                             h.toleranceMeasures[0], h.toleranceMeasures[1]),
+                  std::tuple(440.0f, 440.0f, a4.samples[k].level, 0, 255, 14, 0)) << k;
     }
     EXPECT_NEAR(d.semitones[1].samples[0].harmonics[0].frequency, 466.16376f, 1e-3);
 }

@@ -3,11 +3,31 @@
 // instrument match, and the note pitch.
 #include <gtest/gtest.h>
 
+#include <tuple>
+
 #include "analysis/recognitionFixtures.h"
 
 class NoteBuilding : public RecognitionTest {
 protected:
     double blockTime(uint32_t b) const { return b * song.sampleBlockDuration; }
+    // What a built note must be: its semitone (0: any) and the blocks it starts and ends at
+    // (-1: any).
+    struct ExpectedNote {
+        int midiNote;
+        int first = -1, end = -1;
+    };
+    // Builds the notes of the whole song and compares them with expected.
+    void expectNotes(const std::vector<ExpectedNote>& expected, const char* what = "") {
+        resetNoteList();
+        buildNotes(0, 0);
+        ASSERT_EQ(noteList.count, int(expected.size())) << what;
+        for (size_t i = 0; i < expected.size(); i++) {
+            const Note& n = noteList.notes[i];
+            if (expected[i].midiNote) EXPECT_EQ(n.midiNote, expected[i].midiNote) << what << " note " << i;
+            if (expected[i].first >= 0) EXPECT_NEAR(n.waveStart, blockTime(expected[i].first), 1e-6) << what << " note " << i;
+            if (expected[i].end >= 0) EXPECT_NEAR(n.waveEnd, blockTime(expected[i].end), 1e-6) << what << " note " << i;
+        }
+    }
     // A definition of one sine harmonic per semitone, as the program generates for most names.
     static InstrumentDefinition sineDefinition(const char* name, int voice, int low, int high) {
         InstrumentDefinition d{name, "Sine", "Generated", uint8_t(voice), 1, {70.0f, 30.0f, 10.0f}, 440.0f,
@@ -37,47 +57,27 @@ TEST_F(NoteBuilding, RunsOnOneSemitoneBecomeNotesInTimeOrder) {
     const Note& b = noteList.notes[1];
     EXPECT_NEAR(a.waveStart, blockTime(10), 1e-6);
     EXPECT_NEAR(a.waveEnd, blockTime(40), 1e-6);
-    EXPECT_EQ(a.midiStart, a.waveStart);
-    EXPECT_EQ(a.midiEnd, a.waveEnd);
     EXPECT_NEAR(a.pitch, 220.0, 0.01);
-    EXPECT_EQ(a.midiNote, 57);
-    EXPECT_EQ(a.volumeSum, 30u * 100u);
-    EXPECT_EQ(a.recognitionWeight, 100.0f);
-    EXPECT_EQ(b.midiNote, 64);
     EXPECT_NEAR(b.waveStart, blockTime(50), 1e-6);
-    EXPECT_EQ(b.volumeSum, 40u * 150u);
+    EXPECT_EQ(std::tuple(a.midiStart, a.midiEnd, a.midiNote, a.volumeSum, a.recognitionWeight, b.midiNote, b.volumeSum),
+              std::tuple(a.waveStart, a.waveEnd, 57, 30u * 100u, 100.0f, 64, 40u * 150u));
 }
 
-TEST_F(NoteBuilding, ANoteTwentyCentsSharpKeepsItsSemitone) {
-    makeSong(60);
+TEST_F(NoteBuilding, ASemitoneHoldsThroughSmallWaversAndShortRunsAreDroppedOrJoined) {
+    makeSong(80);
     setPitches(10, 50, 440.0 * std::exp2(0.2 / 12.0));
-    buildNotes(0, 0);
-    ASSERT_EQ(noteList.count, 1);
-    EXPECT_EQ(noteList.notes[0].midiNote, 69);
-}
-
-TEST_F(NoteBuilding, ANoteWaveringAcrossASemitoneBoundaryStaysOneNote) {
+    expectNotes({{69, 10, 50}}, "twenty cents sharp");
     makeSong(80);
     for (uint32_t b = 10; b < 70; b++) setPitch(b, pitchToFrequency(b % 2 ? 60.45 : 60.6));
-    buildNotes(0, 0);
-    EXPECT_EQ(noteList.count, 1);
-}
-
-TEST_F(NoteBuilding, AVoiceNoteShorterThanFiveHundredthsOfASecondIsDropped) {
-    makeSong(60);
-    setPitches(10, 14, 220.0);   // 0.046 s
+    expectNotes({{0, 10, 70}}, "wavering across a semitone boundary");
+    makeSong(80);
+    setPitches(10, 14, 220.0);   // 0.046 s: under a voice's shortest note
     setPitches(30, 35, 220.0);   // 0.058 s
-    buildNotes(0, 0);
-    ASSERT_EQ(noteList.count, 1);
-    EXPECT_NEAR(noteList.notes[0].waveStart, blockTime(30), 1e-6);
-}
-
-TEST_F(NoteBuilding, ASliverBetweenTwoRunsOfOneSemitoneJoinsThem) {
+    expectNotes({{57, 30, 35}}, "short runs");
     makeSong(80);
     setPitches(10, 70, 220.0);
     setPitches(40, 42, 440.0);
-    buildNotes(0, 0);
-    ASSERT_EQ(noteList.count, 1);
+    expectNotes({{57, 10, 70}}, "a sliver between two runs of one semitone");
     EXPECT_NEAR(noteList.notes[0].pitch, 220.0, 0.01) << "the sliver does not pull the pitch";
 }
 
@@ -89,14 +89,8 @@ TEST_F(NoteBuilding, AGlideBetweenTwoNotesIsSplitWhereItPassesTheMiddle) {
     setPitches(10, 40, pitchToFrequency(57));
     for (uint32_t b = 40; b < 48; b++) setPitch(b, pitchToFrequency(glideUp(b)));
     setPitches(48, 80, pitchToFrequency(64));
-    buildNotes(0, 0);
-    ASSERT_EQ(noteList.count, 2);
-    EXPECT_EQ(noteList.notes[0].midiNote, 57);
-    EXPECT_EQ(noteList.notes[1].midiNote, 64);
-    EXPECT_NEAR(noteList.notes[0].waveEnd, blockTime(44), 1e-6) << "60.11 lies nearer 57";
-    EXPECT_NEAR(noteList.notes[1].waveStart, blockTime(44), 1e-6) << "60.89 lies nearer 64";
-    EXPECT_NEAR(noteList.notes[1].waveEnd, blockTime(80), 1e-6);
-
+    // 60.11 at block 43 lies nearer 57, 60.89 at block 44 nearer 64.
+    expectNotes({{57, 10, 44}, {64, 44, 80}});
     // Rebuilt from the second note on, as the opening path does after the next chunk: the
     // first note (built before) still decides where the glide is split.
     buildNotes(sampleOf(44), 1);
@@ -105,46 +99,26 @@ TEST_F(NoteBuilding, AGlideBetweenTwoNotesIsSplitWhereItPassesTheMiddle) {
     EXPECT_EQ(noteList.notes[1].midiNote, 64);
 }
 
-TEST_F(NoteBuilding, ASlowGlideDwellingOnASemitoneIsNoNoteButAShortSteadyNoteIs) {
-    makeSong(90);
+// What lies between two notes: a slow glide dwelling on a semitone is no note, but a short
+// steady note is; a short silence after a glide belongs to the note the glide reached; a long
+// silence keeps two notes apart.
+TEST_F(NoteBuilding, WhatLiesBetweenTwoNotesGoesToTheOneItLeansTo) {
+    makeSong(100);
     setPitches(10, 40, pitchToFrequency(57));
     // 0.093 s around 60, wandering from 59.6 up to 60.4 on the way to 64.
     for (uint32_t b = 40; b < 48; b++) setPitch(b, pitchToFrequency(59.6 + 0.8 * double(b - 40) / 7.0));
     setPitches(48, 80, pitchToFrequency(64));
-    buildNotes(0, 0);
-    ASSERT_EQ(noteList.count, 2);
-    EXPECT_NEAR(noteList.notes[0].waveEnd, blockTime(48), 1e-6) << "every block of the way lies nearer 57";
-    EXPECT_NEAR(noteList.notes[1].waveStart, blockTime(48), 1e-6);
-
-    resetNoteList();
+    expectNotes({{57, 10, 48}, {64, 48, 80}}, "every block of the slow glide lies nearer 57");
     setPitches(40, 48, pitchToFrequency(60));
-    buildNotes(0, 0);
-    ASSERT_EQ(noteList.count, 3);
-    EXPECT_EQ(noteList.notes[1].midiNote, 60);
-}
-
-TEST_F(NoteBuilding, AShortSilenceAfterAGlideBelongsToTheNoteTheGlideReached) {
-    makeSong(90);
-    setPitches(10, 40, pitchToFrequency(57));
+    expectNotes({{57}, {60}, {64}}, "a short steady note");
     const double way[] = {58.5, 60.0, 61.5, 63.0};
     for (uint32_t b = 40; b < 44; b++) setPitch(b, pitchToFrequency(way[b - 40]));
-    // Blocks 44..47 (0.046 s) hold nothing: the consonant of the next syllable.
-    setPitches(48, 80, pitchToFrequency(64));
-    buildNotes(0, 0);
-    ASSERT_EQ(noteList.count, 2);
-    EXPECT_NEAR(noteList.notes[0].waveEnd, blockTime(42), 1e-6);
-    EXPECT_NEAR(noteList.notes[1].waveStart, blockTime(42), 1e-6) << "61.5 lies nearer 64; the silence joins it";
-}
-
-TEST_F(NoteBuilding, ALongSilenceKeepsTwoNotesApart) {
-    makeSong(100);
-    setPitches(10, 40, pitchToFrequency(57));
+    setPitches(44, 48, 0.0);   // 0.046 s of nothing: the consonant of the next syllable
+    expectNotes({{57, 10, 42}, {64, 42, 80}}, "61.5 lies nearer 64; the silence joins it");
     setPitches(40, 42, pitchToFrequency(61.5));   // a sliver leaning towards the next note
-    // Blocks 42..49 (0.093 s) are silent: longer than a glide's gap.
+    setPitches(42, 50, 0.0);                      // 0.093 s of silence: longer than a glide's gap
     setPitches(50, 80, pitchToFrequency(64));
-    buildNotes(0, 0);
-    ASSERT_EQ(noteList.count, 2);
-    EXPECT_NEAR(noteList.notes[1].waveStart, blockTime(50), 1e-6);
+    expectNotes({{57}, {64, 50, 80}}, "a long silence");
 }
 
 TEST_F(NoteBuilding, ANoteStartsWhereItsPartialRoseButNotInTheFaintNoiseBeforeIt) {
@@ -243,19 +217,17 @@ TEST_F(NoteBuilding, AnOctaveSlipAtANotesStartJoinsItButAShortLeapStays) {
     EXPECT_EQ(noteList.notes[0].midiNote, 56);
 }
 
-TEST_F(NoteBuilding, ANoteSplitsAtASyllableStartWellInsideIt) {
+TEST_F(NoteBuilding, ANoteSplitsAtASyllableStartWellInsideItWhenSyllablesAreFound) {
     makeSong(120);
     setPitches(0, 100, 220.0, 100);
     blockData(50).blockFlags |= BLOCK_SYLLABLE_START;
     blockData(5).blockFlags |= BLOCK_SYLLABLE_START;    // 0.058 s from the start: too close
-    buildNotes(0, 0);
-    ASSERT_EQ(noteList.count, 2);
-    EXPECT_NEAR(noteList.notes[0].waveEnd, blockTime(50), 1e-6);
-    EXPECT_NEAR(noteList.notes[1].waveStart, blockTime(50), 1e-6);
-    EXPECT_NEAR(noteList.notes[1].waveEnd, blockTime(100), 1e-6);
+    expectNotes({{57, 0, 50}, {57, 50, 100}});
     EXPECT_EQ(noteList.notes[0].volumeSum, 5000u);
     EXPECT_EQ(noteList.notes[1].volumeSum, 5000u);
     EXPECT_TRUE(noteList.notes[0].recognitionCode & NOTE_SPLIT_AT_SYLLABLE);
+    recognitionOptions.findSyllables = false;
+    expectNotes({{57, 0, 100}}, "without find syllables");
 }
 
 TEST_F(NoteBuilding, EachPartOfASplitNoteSoundsItsOwnPitch) {
@@ -270,19 +242,9 @@ TEST_F(NoteBuilding, EachPartOfASplitNoteSoundsItsOwnPitch) {
     buildNotes(0, 0);
     ASSERT_EQ(noteList.count, 2);
     EXPECT_NEAR(noteList.notes[0].pitch, 740.0, 0.01);
-    EXPECT_EQ(noteList.notes[0].midiNote, 78);
     EXPECT_NEAR(noteList.notes[1].waveStart, blockTime(59), 1e-6);
     EXPECT_NEAR(noteList.notes[1].pitch, 784.0, 0.01);
-    EXPECT_EQ(noteList.notes[1].midiNote, 79);
-}
-
-TEST_F(NoteBuilding, WithoutFindSyllablesNothingSplits) {
-    makeSong(120);
-    recognitionOptions.findSyllables = false;
-    setPitches(0, 100, 220.0);
-    blockData(50).blockFlags |= BLOCK_SYLLABLE_START;
-    buildNotes(0, 0);
-    EXPECT_EQ(noteList.count, 1);
+    EXPECT_EQ(std::tuple(noteList.notes[0].midiNote, noteList.notes[1].midiNote), std::tuple(78, 79));
 }
 
 TEST_F(NoteBuilding, TheNotesToDropAreRemovedBeforeTheNewOnesAreAppended) {
@@ -354,26 +316,15 @@ TEST_F(NoteBuilding, NotePitchLeavesOutTheStartAndWhatLiesASemitoneAway) {
     EXPECT_NEAR(notePitch(0, 50, 392.0), 392.0, 0.01) << "a given mean starts the count";
 }
 
-class NoteBuildingDurations : public ::testing::Test {};
-
-TEST_F(NoteBuildingDurations, ShortestNoteByVoiceAndPitch) {
-    EXPECT_DOUBLE_EQ(shortestNoteSeconds(53, 30.0), 0.05);
-    EXPECT_DOUBLE_EQ(shortestNoteSeconds(52, 90.0), 0.05);
-    EXPECT_DOUBLE_EQ(shortestNoteSeconds(78, 10.0), 0.05);
-    EXPECT_DOUBLE_EQ(shortestNoteSeconds(0, 24.0), 0.25);
-    EXPECT_DOUBLE_EQ(shortestNoteSeconds(40, 60.0), 1.0 / 12.0);
-    EXPECT_NEAR(shortestNoteSeconds(40, 42.0), 1.0 / 6.0, 1e-12);
-    EXPECT_DOUBLE_EQ(shortestNoteSeconds(40, 100.0), 1.0 / 12.0);
-}
-
-TEST_F(NoteBuildingDurations, LongestSustainByVoiceAndPitch) {
-    EXPECT_DOUBLE_EQ(longestSustainSeconds(0, 20.0), 10.0);
-    EXPECT_DOUBLE_EQ(longestSustainSeconds(5, 46.0), 7.5);
-    EXPECT_DOUBLE_EQ(longestSustainSeconds(3, 80.0), 5.0);
-    EXPECT_DOUBLE_EQ(longestSustainSeconds(24, 24.0), 5.0);
-    EXPECT_DOUBLE_EQ(longestSustainSeconds(39, 68.0), 3.0);
-    EXPECT_DOUBLE_EQ(longestSustainSeconds(6, 24.0), 1000.0);
-    EXPECT_DOUBLE_EQ(longestSustainSeconds(53, 60.0), 1000.0);
+TEST(NoteBuildingDurations, ShortestNoteAndLongestSustainByVoiceAndPitch) {
+    const std::tuple<int, double, double> shortest[] = {{53, 30.0, 0.05},      {52, 90.0, 0.05},     {78, 10.0, 0.05},
+                                                        {0, 24.0, 0.25},       {40, 60.0, 1.0 / 12}, {40, 42.0, 1.0 / 6},
+                                                        {40, 100.0, 1.0 / 12}};
+    for (auto [voice, pitch, seconds] : shortest) EXPECT_NEAR(shortestNoteSeconds(voice, pitch), seconds, 1e-12) << voice;
+    const std::tuple<int, double, double> longest[] = {{0, 20.0, 10.0}, {5, 46.0, 7.5},     {3, 80.0, 5.0},
+                                                       {24, 24.0, 5.0}, {39, 68.0, 3.0},    {6, 24.0, 1000.0},
+                                                       {53, 60.0, 1000.0}};
+    for (auto [voice, pitch, seconds] : longest) EXPECT_DOUBLE_EQ(longestSustainSeconds(voice, pitch), seconds) << voice;
 }
 
 TEST_F(NoteBuilding, APianoNoteLongerThanItsSustainIsNoNote) {

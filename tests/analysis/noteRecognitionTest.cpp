@@ -9,8 +9,8 @@
 #include "audio/waveWorkingFile.h"
 #include "platform/files.h"
 #include "resources/strings.h"
+#include "shell/closeSong.h"
 #include "shell/paths.h"
-#include "store/workingFiles.h"
 #include "support/testSupport.h"
 
 class Recognition : public RecognitionTest {

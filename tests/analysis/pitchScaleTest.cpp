@@ -4,6 +4,7 @@
 
 #include <cmath>
 #include <limits>
+#include <tuple>
 
 #include "analysis/pitchScale.h"
 
@@ -14,119 +15,62 @@ static const double SEMITONE_TOLERANCE = 1e-3;
 // Frequencies are compared to a millionth of their size.
 static const double RELATIVE_TOLERANCE = 1e-6;
 
-TEST(PitchScaleConversions, MiddleAIsSixtyNineAndOctavesAreTwelveSemitones) {
-    EXPECT_DOUBLE_EQ(frequencyToPitch(440.0), 69.0);
-    EXPECT_DOUBLE_EQ(frequencyToPitch(880.0), 81.0);
-    EXPECT_DOUBLE_EQ(frequencyToPitch(220.0), 57.0);
-    EXPECT_DOUBLE_EQ(frequencyToPitch(13.75), 9.0);
-    EXPECT_NEAR(frequencyToPitch(450.0), 69.389, SEMITONE_TOLERANCE);
-}
-
-TEST(PitchScaleConversions, AnInstrumentsOwnMiddleAMovesTheScale) {
-    EXPECT_DOUBLE_EQ(frequencyToPitch(432.0, 432.0), 69.0);
-    EXPECT_NEAR(frequencyToPitch(440.0, 432.0), 69.318, SEMITONE_TOLERANCE);
-    EXPECT_NEAR(pitchToFrequency(69.0, 432.0), 432.0, 432.0 * RELATIVE_TOLERANCE);
-    EXPECT_EQ(frequencyToSemitone(445.0, 432.0), 70) << "69.513 with A = 432 Hz";
-    EXPECT_EQ(frequencyToSemitone(445.0), 69) << "69.196 with A = 440 Hz";
+// Middle A is 69 and octaves are twelve semitones (an instrument's own middle A moves the
+// scale); pitches below the scale give 0 and above it 255, as do zero, negative and undefined
+// frequencies (0) and an infinite one (255). The nearest semitone is a note's midiNote.
+TEST(PitchScaleConversions, FrequenciesGiveTheirSemitoneNumbersWithinTheScale) {
+    const std::tuple<double, double, double, int> cases[] = {
+        // frequency, middle A, semitone number, nearest semitone
+        {440.0, 440.0, 69.0, 69},      {880.0, 440.0, 81.0, 81},       {220.0, 440.0, 57.0, 57},
+        {13.75, 440.0, 9.0, 9},        {450.0, 440.0, 69.389, 69},     {432.0, 432.0, 69.0, 69},
+        {440.0, 432.0, 69.318, 69},    {445.0, 432.0, 69.513, 70},     {445.0, 440.0, 69.196, 69},
+        {466.16, 440.0, 69.99986, 70}, {452.8, 440.0, 69.4964, 69},    {453.0, 440.0, 69.5041, 70},
+        {8.0, 440.0, 0.0, 0},          {8.5, 440.0, 0.673, 1},         {2.0e7, 440.0, 254.666, 255},
+        {3.0e7, 440.0, 255.0, 255},    {0.0, 440.0, 0.0, 0},           {-440.0, 440.0, 0.0, 0},
+        {NOT_A_NUMBER, 440.0, 0.0, 0}, {INFINITE, 440.0, 255.0, 255}};
+    for (auto [frequency, middleA, pitch, semitone] : cases) {
+        EXPECT_NEAR(frequencyToPitch(frequency, middleA), pitch, SEMITONE_TOLERANCE) << frequency;
+        EXPECT_EQ(frequencyToSemitone(frequency, middleA), semitone) << frequency;
+    }
 }
 
 TEST(PitchScaleConversions, SemitoneNumbersGoBackToFrequenciesFractionsIncluded) {
-    EXPECT_NEAR(pitchToFrequency(69.0), 440.0, 440.0 * RELATIVE_TOLERANCE);
-    EXPECT_NEAR(pitchToFrequency(81.0), 880.0, 880.0 * RELATIVE_TOLERANCE);
-    EXPECT_NEAR(pitchToFrequency(9.0), 13.75, 13.75 * RELATIVE_TOLERANCE);
-    EXPECT_NEAR(pitchToFrequency(69.5), 452.893, 452.893 * RELATIVE_TOLERANCE);
-    EXPECT_NEAR(pitchToFrequency(-3.0), 6.875, 6.875 * RELATIVE_TOLERANCE);
+    const std::tuple<double, double, double> cases[] = {{69.0, 440.0, 440.0},   {81.0, 440.0, 880.0},
+                                                        {9.0, 440.0, 13.75},    {69.5, 440.0, 452.893},
+                                                        {-3.0, 440.0, 6.875},   {69.0, 432.0, 432.0}};
+    for (auto [pitch, middleA, frequency] : cases)
+        EXPECT_NEAR(pitchToFrequency(pitch, middleA), frequency, frequency * RELATIVE_TOLERANCE) << pitch;
 }
 
-TEST(PitchScaleConversions, PitchesBelowTheScaleGiveZeroAndAboveItTwoFiftyFive) {
-    EXPECT_EQ(frequencyToPitch(8.0), 0.0) << "semitone -0.376";
-    EXPECT_NEAR(frequencyToPitch(8.5), 0.673, SEMITONE_TOLERANCE);
-    EXPECT_NEAR(frequencyToPitch(2.0e7), 254.666, SEMITONE_TOLERANCE);
-    EXPECT_EQ(frequencyToPitch(3.0e7), 255.0) << "semitone 261.7";
+// An exact half rounds up, just below a half down; rounded pitches are limited to 0 .. 255
+// and undefined ones give 0.
+TEST(PitchScaleSemitone, PitchesRoundToTheNearestSemitoneWithinTheScale) {
+    const std::pair<double, int> cases[] = {{69.5, 70},    {68.5, 69},  {0.5, 1},      {254.5, 255},
+                                            {69.499, 69},  {69.0, 69},  {68.999, 69},  {0.49, 0},
+                                            {255.0, 255},  {300.0, 255}, {-2.0, 0},    {NOT_A_NUMBER, 0},
+                                            {INFINITE, 255}};
+    for (auto [pitch, semitone] : cases) EXPECT_EQ(roundSemitone(pitch), semitone) << pitch;
 }
 
-TEST(PitchScaleConversions, ZeroNegativeAndUndefinedFrequenciesGiveZero) {
-    EXPECT_EQ(frequencyToPitch(0.0), 0.0);
-    EXPECT_EQ(frequencyToPitch(-440.0), 0.0);
-    EXPECT_EQ(frequencyToPitch(NOT_A_NUMBER), 0.0);
-    EXPECT_EQ(frequencyToPitch(INFINITE), 255.0);
-    EXPECT_EQ(frequencyToSemitone(0.0), 0);
-    EXPECT_EQ(frequencyToSemitone(-440.0), 0);
-    EXPECT_EQ(frequencyToSemitone(NOT_A_NUMBER), 0);
-    EXPECT_EQ(frequencyToSemitone(INFINITE), 255);
-}
-
-TEST(PitchScaleSemitone, FrequenciesGoToTheNearestSemitone) {
-    EXPECT_EQ(frequencyToSemitone(440.0), 69);
-    EXPECT_EQ(frequencyToSemitone(466.16), 70) << "69.99986";
-    EXPECT_EQ(frequencyToSemitone(450.0), 69) << "69.389";
-    EXPECT_EQ(frequencyToSemitone(452.8), 69) << "69.4964";
-    EXPECT_EQ(frequencyToSemitone(453.0), 70) << "69.5041";
-    EXPECT_EQ(frequencyToSemitone(8.5), 1) << "0.673";
-}
-
-TEST(PitchScaleSemitone, SemitonesAreLimitedToZeroAndTwoFiftyFive) {
-    EXPECT_EQ(frequencyToSemitone(8.0), 0);
-    EXPECT_EQ(frequencyToSemitone(2.0e7), 255) << "254.666 rounds to the top";
-    EXPECT_EQ(frequencyToSemitone(3.0e7), 255);
-}
-
-TEST(PitchScaleSemitone, AnExactHalfRoundsUp) {
-    EXPECT_EQ(roundSemitone(69.5), 70);
-    EXPECT_EQ(roundSemitone(68.5), 69);
-    EXPECT_EQ(roundSemitone(0.5), 1);
-    EXPECT_EQ(roundSemitone(254.5), 255);
-}
-
-TEST(PitchScaleSemitone, JustBelowAHalfRoundsDownAndJustBelowAWholeRoundsUp) {
-    EXPECT_EQ(roundSemitone(69.499), 69);
-    EXPECT_EQ(roundSemitone(69.0), 69);
-    EXPECT_EQ(roundSemitone(68.999), 69);
-    EXPECT_EQ(roundSemitone(0.49), 0);
-}
-
-TEST(PitchScaleSemitone, RoundedPitchesAreLimitedAndUndefinedOnesGiveZero) {
-    EXPECT_EQ(roundSemitone(255.0), 255);
-    EXPECT_EQ(roundSemitone(300.0), 255);
-    EXPECT_EQ(roundSemitone(-2.0), 0);
-    EXPECT_EQ(roundSemitone(NOT_A_NUMBER), 0);
-    EXPECT_EQ(roundSemitone(INFINITE), 255);
-}
-
+// Frequencies give twice their semitone number, not limited below or above the scale; zero,
+// negative and undefined frequencies, or no middle A, give 0.
 TEST(PitchScaleHalfSemitone, FrequenciesGiveTwiceTheirSemitoneNumber) {
-    EXPECT_EQ(frequencyToHalfSemitone(440.0), 138);
-    EXPECT_EQ(frequencyToHalfSemitone(880.0), 162);
-    EXPECT_EQ(frequencyToHalfSemitone(13.75), 18);
-    EXPECT_EQ(frequencyToHalfSemitone(452.893), 139) << "semitone 69.5";
-    EXPECT_EQ(frequencyToHalfSemitone(432.0, 432.0), 138);
+    const std::tuple<double, double, int> cases[] = {
+        {440.0, 440.0, 138}, {880.0, 440.0, 162},  {13.75, 440.0, 18},        {452.893, 440.0, 139},
+        {432.0, 432.0, 138}, {1.71875, 440.0, -54}, {4.0e7, 440.0, 534},      {0.0, 440.0, 0},
+        {-440.0, 440.0, 0},  {NOT_A_NUMBER, 440.0, 0}, {INFINITE, 440.0, 0}, {440.0, 0.0, 0}};
+    for (auto [frequency, middleA, half] : cases) EXPECT_EQ(frequencyToHalfSemitone(frequency, middleA), half) << frequency;
 }
 
-TEST(PitchScaleHalfSemitone, PitchesBelowTheScaleAreNotLimited) {
-    EXPECT_EQ(frequencyToHalfSemitone(1.71875), -54) << "three octaves below 13.75 Hz: semitone -27";
-    EXPECT_EQ(frequencyToHalfSemitone(4.0e7), 534) << "semitone 266.67";
-}
-
+// Quarters round to even, then odd values halve upwards, negative ones too.
 TEST(PitchScaleHalfSemitone, QuartersRoundToEvenThenOddValuesHalveUpwards) {
-    EXPECT_EQ(roundHalfSemitone(69.0), 138);
-    EXPECT_EQ(roundHalfSemitone(69.1), 138) << "276.4 quarters";
-    EXPECT_EQ(roundHalfSemitone(69.125), 138) << "276.5 quarters: the tie goes to 276";
-    EXPECT_EQ(roundHalfSemitone(69.2), 139) << "276.8 quarters round to 277, halved upwards";
-    EXPECT_EQ(roundHalfSemitone(69.375), 139) << "277.5 quarters: the tie goes to 278";
-    EXPECT_EQ(roundHalfSemitone(69.5), 139);
-    EXPECT_EQ(roundHalfSemitone(69.75), 140);
-}
-
-TEST(PitchScaleHalfSemitone, NegativePitchesHalveUpwardsToo) {
-    EXPECT_EQ(roundHalfSemitone(-1.0), -2);
-    EXPECT_EQ(roundHalfSemitone(-0.75), -1) << "-3 quarters";
-    EXPECT_EQ(roundHalfSemitone(-0.625), -1) << "-2.5 quarters: the tie goes to -2";
-}
-
-TEST(PitchScaleHalfSemitone, ZeroNegativeAndUndefinedFrequenciesGiveZero) {
-    EXPECT_EQ(frequencyToHalfSemitone(0.0), 0);
-    EXPECT_EQ(frequencyToHalfSemitone(-440.0), 0);
-    EXPECT_EQ(frequencyToHalfSemitone(NOT_A_NUMBER), 0);
-    EXPECT_EQ(frequencyToHalfSemitone(INFINITE), 0);
-    EXPECT_EQ(frequencyToHalfSemitone(440.0, 0.0), 0) << "no middle A";
-    EXPECT_EQ(roundHalfSemitone(NOT_A_NUMBER), 0);
+    const std::pair<double, int> cases[] = {
+        {69.0, 138},   {69.1, 138},   // 276.4 quarters
+        {69.125, 138},                 // 276.5 quarters: the tie goes to 276
+        {69.2, 139},                   // 276.8 quarters round to 277, halved upwards
+        {69.375, 139},                 // 277.5 quarters: the tie goes to 278
+        {69.5, 139},   {69.75, 140},  {-1.0, -2},   {-0.75, -1},   // -3 quarters
+        {-0.625, -1},                  // -2.5 quarters: the tie goes to -2
+        {NOT_A_NUMBER, 0}};
+    for (auto [pitch, half] : cases) EXPECT_EQ(roundHalfSemitone(pitch), half) << pitch;
 }

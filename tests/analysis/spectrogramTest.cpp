@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <numeric>
+#include <tuple>
 
 #include "analysis/amplitudeHistogram.h"
 #include "analysis/analysisFixtures.h"
@@ -34,21 +35,14 @@ protected:
 };
 
 TEST(SpectrogramGeometry, BinsAndHopFollowTheSampleRate) {
-    EXPECT_EQ(spectrogramBinsForRate(8000), 512u);
-    EXPECT_EQ(spectrogramHopForRate(8000), 64u);
-    EXPECT_EQ(spectrogramHopForRate(11025), 64u);
-    EXPECT_EQ(spectrogramBinsForRate(16537), 512u);
-    EXPECT_EQ(spectrogramBinsForRate(16538), 1024u);
-    EXPECT_EQ(spectrogramHopForRate(22050), 128u);
-    EXPECT_EQ(spectrogramHopForRate(32000), 256u);
-    EXPECT_EQ(spectrogramBinsForRate(33074), 1024u);
-    EXPECT_EQ(spectrogramBinsForRate(33075), 2048u);
-    EXPECT_EQ(spectrogramHopForRate(44100), 256u);
-    EXPECT_EQ(spectrogramHopForRate(48000), 256u);
-    EXPECT_EQ(spectrogramBinsForRate(66149), 2048u);
-    EXPECT_EQ(spectrogramBinsForRate(66150), 4096u);
-    EXPECT_EQ(spectrogramHopForRate(96000), 512u);
-    EXPECT_EQ(spectrogramHopForRate(100), 4u) << "at least 4";
+    const std::tuple<uint32_t, uint32_t, uint32_t> cases[] = {
+        {8000, 512, 64},    {11025, 512, 64},   {16537, 512, 128},   {16538, 1024, 128}, {22050, 1024, 128},
+        {32000, 1024, 256}, {33074, 1024, 256}, {33075, 2048, 256},  {44100, 2048, 256}, {48000, 2048, 256},
+        {66149, 2048, 512}, {66150, 4096, 512}, {96000, 4096, 512},  {100, 512, 4}};   // a hop of at least 4
+    for (auto [rate, bins, hop] : cases) {
+        EXPECT_EQ(spectrogramBinsForRate(rate), bins) << rate;
+        EXPECT_EQ(spectrogramHopForRate(rate), hop) << rate;
+    }
 }
 
 TEST_F(SpectrogramTest, ASineOnABinPeaksThereWithHalfTheWindowsSum) {
@@ -111,9 +105,8 @@ TEST_F(SpectrogramTest, AQuietChunkIsGatedToSilenceUnlessTheBoostLiftsIt) {
     recognitionOptions.amplitudeBoost = 0.25f;
     ASSERT_EQ(createMagnitudeSpectrogram(0), 0);
     EXPECT_GT(largestIn(80), 90000u) << "a boost of 4 lifts the chunk over the silence level";
-}
-
-TEST_F(SpectrogramTest, EightBitSilenceIsGatedAgainstItsOwnLevel) {
+    // 8-bit silence is gated against its own level.
+    emptyAnalysisState();
     holdWholeSignal(toneSignal(440.0, 0.6, 1.0, 44100), 8);
     ASSERT_EQ(createMagnitudeSpectrogram(0), 0);
     EXPECT_EQ(largestIn(80), 0u);
@@ -150,7 +143,7 @@ TEST_F(SpectrogramTest, PowerSpectrumRowsShareThePlainTransformsScale) {
 
 TEST_F(SpectrogramTest, RowsThatCannotBeGrownGiveTheMemoryMessage) {
     holdWholeSignal(toneSignal(440.0, 8000.0, 1.0, 44100));
-    failSpectrogramAllocation(1);
+    failAllocation(1);
     EXPECT_EQ(createMagnitudeSpectrogram(0), -1);
     EXPECT_EQ(lastMessageText(),
               "Sorry - there is insufficient memory available to continue. Please try freeing up some memory from "

@@ -8,19 +8,21 @@
 #include <cstring>
 #include <mutex>
 #include <thread>
+#include <tuple>
 
 #include "analysis/frequencyAnalysis.h"
 #include "analysis/recognitionOptions.h"
 #include "analysis/signalGenerator.h"
 #include "audio/audioActivity.h"
 #include "audio/openWaveFile.h"
-#include "audio/waveFixtures.h"
+#include "audio/openingFixtures.h"
 #include "audio/waveWorkingFile.h"
 #include "notes/noteList.h"
 #include "platform/files.h"
 #include "platform/mainloop.h"
 #include "platform/sync.h"
 #include "platform/ui.h"
+#include "shell/closeSong.h"
 #include "shell/mainFrame.h"
 #include "shell/paths.h"
 #include "shell/saveSong.h"
@@ -28,20 +30,12 @@
 #include "store/ftBlockStore.h"
 #include "store/hiresFTBlockStore.h"
 #include "store/song.h"
-#include "store/workingFiles.h"
 #include "support/testSupport.h"
 
 namespace {
 
-const uint32_t RATE = 44100;
+const uint32_t RATE = OPENING_RATE;
 const uint32_t BLOCK = 512;   // samples of a block at 44,100 Hz with the default pitch range
-
-std::vector<uint8_t> melodyBytes(double seconds) {
-    MelodyGenerator generator;
-    std::vector<uint8_t> bytes(size_t(seconds * RATE) * 2);
-    generator.fill16(bytes.data(), uint32_t(bytes.size() / 2));
-    return bytes;
-}
 
 std::vector<uint8_t> toneBytes(double frequency, double seconds, int bits = 16, uint32_t rate = RATE) {
     return toSampleBytes(toneSignal(frequency, bits == 16 ? 8000.0 : 60.0, seconds, rate, {1.0, 0.5, 0.25}), bits);
@@ -72,114 +66,42 @@ bool processingMutexFree() {
     return true;
 }
 
-class OpenWaveTest : public ::testing::Test {
-protected:
-    void SetUp() override {
-        savedPaths = paths;
-        setSharedBasePath(folder.path());
-        makeFolder(paths.sharedFolder);
-        clean();
-    }
-    void TearDown() override {
-        clean();
-        paths = savedPaths;
-        setFreeDiskSpaceOverride(NO_FREE_SPACE_OVERRIDE);
-    }
-    void clean() {
-        resetOpeningState();
-        resetMainLoop();
-        setFrameWindowFunctions(nullptr);
-        resetFrameState();
-        releaseFrequencyAnalysis();
-        closeSong();
-        resetSongNames();
-        resetSettings();
-        resetRecognitionOptions();
-        clearFileFailures();
-        setFreeDiskSpaceOverride(int64_t(1) << 40);
-        audioActivity = AudioActivity{};
-        openingState.quickPreferences = nullptr;
-        clearUiCalls();
-    }
-    std::string writeWave(const std::string& name, const std::vector<uint8_t>& file) {
-        std::string path = folder.file(name);
-        writeFileBytes(path, file);
-        return path;
-    }
-    std::string writeMono(const std::string& name, const std::vector<uint8_t>& samples, int bits = 16,
-                          uint32_t rate = RATE) {
-        return writeWave(name, pcmWave(1, rate, uint16_t(bits), samples));
-    }
-    // Opens path and waits for the worker to end, serving the main loop as the program does.
-    void openAndWait(const std::string& path) {
-        ASSERT_EQ(openWaveFile(path), 1);
-        ASSERT_TRUE(audioActivity.opening) << lastMessageText();
-        waitForOpeningToEnd();
-        ASSERT_FALSE(audioActivity.opening);
-    }
-    TempFolder folder;
-    Paths savedPaths;
-};
+using OpenWaveTest = OpeningTest;
 
 // ---- refusals ----
 
 using OpenWaveRefusals = OpenWaveTest;
 
-TEST_F(OpenWaveRefusals, AFileFasterThan44100HzIsRefusedAndTheSongKeepsItsAudio) {
-    openAndWait(writeMono("first.wav", toneBytes(220, 1.0)));
-    uint32_t blocks = song.blockCount;
-    std::vector<uint8_t> working = readFileBytes(sharedFilePath("CS.fw"));
-    std::vector<uint8_t> ft = readFileBytes(sharedFilePath("CS.ft"));
-    int notes = noteList.count;
-    ASSERT_GT(blocks, 0u);
-    clearUiCalls();
-
-    EXPECT_EQ(openWaveFile(writeMono("fast.wav", toneBytes(220, 1.0, 16, 48000), 16, 48000)), 1);
-    EXPECT_EQ(lastMessageText(),
-              "Sorry - this wave file cannot be opened.\n\n44100Hz is the highest sample rate supported by this product.");
-    EXPECT_EQ(messageCount(), 1);
-    EXPECT_FALSE(audioActivity.opening);
-    EXPECT_EQ(song.blockCount, blocks);
-    EXPECT_EQ(song.waveFormat.samplesPerSec, RATE);
-    EXPECT_EQ(noteList.count, notes);
-    EXPECT_EQ(readFileBytes(sharedFilePath("CS.fw")), working);
-    EXPECT_EQ(readFileBytes(sharedFilePath("CS.ft")), ft);
-}
-
-TEST_F(OpenWaveRefusals, SeventeenChannelsAreRefusedBeforeAnythingIsCreated) {
-    std::vector<uint8_t> frames(17 * 2 * 4410, 0);
-    EXPECT_EQ(openWaveFile(writeWave("many.wav", pcmWave(17, RATE, 16, frames))), 1);
-    EXPECT_EQ(lastMessageText(), "This waveform contains too many channels and cannot be loaded.");
-    EXPECT_FALSE(audioActivity.opening);
-    EXPECT_EQ(song.blockCount, 0u);
-    EXPECT_FALSE(fileExists(sharedFilePath("CS.fw")));
-    EXPECT_FALSE(fileExists(sharedFilePath("CS.ft")));
-}
-
-TEST_F(OpenWaveRefusals, A22050HzFileIsNotAppendedToA44100HzSong) {
+// A file faster than 44,100 Hz, or one that does not match the song's rate and bits, is
+// refused and the song keeps its audio, its notes and its files.
+TEST_F(OpenWaveRefusals, AFileTheSongCannotTakeIsRefusedAndTheSongKeepsWhatItHas) {
     openAndWait(writeMono("first.wav", melodyBytes(1.5)));
     uint32_t blocks = song.blockCount;
     int notes = noteList.count;
-    std::vector<uint8_t> working = readFileBytes(sharedFilePath("CS.fw"));
-    std::vector<uint8_t> ftIndex = readFileBytes(sharedFilePath("CS.fi"));
-    std::vector<uint8_t> hiresIndex = readFileBytes(sharedFilePath("CS.fi+"));
-    clearUiCalls();
-
-    EXPECT_EQ(openWaveFile(writeMono("half.wav", toneBytes(220, 1.0, 16, 22050), 16, 22050)), 1);
-    EXPECT_EQ(lastMessageText(), "This waveform cannot be appended to the current document as it either has a "
-                                 "different sample rate, bit size or number of channels.");
-    EXPECT_EQ(uiCalls().back().kind, MESSAGE_ERROR);
-    EXPECT_FALSE(audioActivity.opening);
-    EXPECT_EQ(song.blockCount, blocks);
-    EXPECT_EQ(song.waveFormat.samplesPerSec, RATE);
-    EXPECT_EQ(noteList.count, notes);
-    EXPECT_EQ(readFileBytes(sharedFilePath("CS.fw")), working);
-    EXPECT_EQ(readFileBytes(sharedFilePath("CS.fi")), ftIndex);
-    EXPECT_EQ(readFileBytes(sharedFilePath("CS.fi+")), hiresIndex);
-    // An 8-bit file at the song's rate is refused the same way.
-    EXPECT_EQ(openWaveFile(writeMono("eight.wav", toneBytes(220, 1.0, 8), 8)), 1);
-    EXPECT_EQ(messageCount(), 2);
-    EXPECT_EQ(song.blockCount, blocks);
+    ASSERT_GT(blocks, 0u);
+    std::vector<std::vector<uint8_t>> files;
+    for (const char* name : {"CS.fw", "CS.ft", "CS.fi", "CS.fi+"}) files.push_back(readFileBytes(sharedFilePath(name)));
+    const char* cannotAppend = "This waveform cannot be appended to the current document as it either has a "
+                               "different sample rate, bit size or number of channels.";
+    const std::pair<std::string, const char*> cases[] = {
+        {writeMono("fast.wav", toneBytes(220, 1.0, 16, 48000), 16, 48000),
+         "Sorry - this wave file cannot be opened.\n\n44100Hz is the highest sample rate supported by this product."},
+        {writeMono("half.wav", toneBytes(220, 1.0, 16, 22050), 16, 22050), cannotAppend},
+        {writeMono("eight.wav", toneBytes(220, 1.0, 8), 8), cannotAppend}};
+    for (const auto& [path, text] : cases) {
+        clearUiCalls();
+        EXPECT_EQ(openWaveFile(path), 1);
+        EXPECT_EQ(lastMessageText(), text);
+        EXPECT_EQ(messageCount(), 1);
+        EXPECT_EQ(uiCalls().back().kind, MESSAGE_ERROR);
+        EXPECT_FALSE(audioActivity.opening);
+        EXPECT_EQ(song.blockCount, blocks);
+        EXPECT_EQ(song.waveFormat.samplesPerSec, RATE);
+        EXPECT_EQ(noteList.count, notes);
+        int i = 0;
+        for (const char* name : {"CS.fw", "CS.ft", "CS.fi", "CS.fi+"})
+            EXPECT_EQ(readFileBytes(sharedFilePath(name)), files[i++]) << name;
+    }
 }
 
 TEST_F(OpenWaveRefusals, ASecondOpeningWhileOneRunsIsRefusedAndNotAppended) {
@@ -195,51 +117,53 @@ TEST_F(OpenWaveRefusals, ASecondOpeningWhileOneRunsIsRefusedAndNotAppended) {
     EXPECT_EQ(songNames.remembered[OUTPUT_WAVE], folder.file("first"));
 }
 
-TEST_F(OpenWaveRefusals, OpeningWhileRecordingIsRefused) {
-    audioActivity.recording = true;
-    EXPECT_EQ(openWaveFile(writeMono("tone.wav", toneBytes(220, 1.0))), 1);
-    EXPECT_EQ(lastMessageText(), "Sorry - this cannot be done whilst recording audio.");
-    EXPECT_FALSE(audioActivity.opening);
-    EXPECT_FALSE(fileExists(sharedFilePath("CS.fw")));
-}
-
-TEST_F(OpenWaveRefusals, FilesTheProgramCannotReadGetTheirMessages) {
+// A file the program cannot read, one with too many channels or samples it cannot take, an
+// opening while recording or with less than 100 MB free: refused before anything is created.
+TEST_F(OpenWaveRefusals, FilesTheProgramCannotTakeGetTheirMessagesAndCreateNothing) {
     const std::string cannotOpen = "This file cannot be opened. Please check it is not open in another application.";
     const std::string unsupported =
         "Sorry - this wave file contains audio in a unsupported format.\n\nPlease note that 32-bit audio is not "
         "supported by this product.";
-    EXPECT_EQ(openWaveFile(folder.file("missing.wav")), 1);
-    EXPECT_EQ(lastMessageText(), cannotOpen);
+    const std::string diskLow = "Disk space is low on the Torvellan Shared drive so recording cannot begin. Please "
+                                "free some space or choose an alternative drive from Preferences.";
     writeFileText(folder.file("text.wav"), "not a wave file at all");
-    EXPECT_EQ(openWaveFile(folder.file("text.wav")), 1);
-    EXPECT_EQ(lastMessageText(), cannotOpen);
-    // Float samples without a fact chunk: the reader's code 12.
     std::vector<uint8_t> data(4 * 4410, 0);
-    EXPECT_EQ(openWaveFile(writeWave("float.wav", riffWave({{"fmt ", formatBody(3, 1, RATE, 32)}, {"data", data}}))), 1);
-    EXPECT_EQ(lastMessageText(), unsupported);
-    // With a fact chunk the reader takes it, and so does 24-bit PCM; neither is 8- or 16-bit PCM.
-    EXPECT_EQ(openWaveFile(writeWave("factfloat.wav", riffWave({{"fmt ", formatBody(3, 1, RATE, 32)},
-                                                                {"fact", u32Body(4410)},
-                                                                {"data", data}}))),
-              1);
-    EXPECT_EQ(lastMessageText(), unsupported);
-    EXPECT_EQ(openWaveFile(writeWave("deep.wav", pcmWave(1, RATE, 24, std::vector<uint8_t>(3 * 4410, 0)))), 1);
-    EXPECT_EQ(lastMessageText(), unsupported);
-    EXPECT_EQ(messageCount(), 5);
-    EXPECT_FALSE(audioActivity.opening);
-    EXPECT_EQ(song.blockCount, 0u);
-    EXPECT_FALSE(fileExists(sharedFilePath("CS.fw")));
-}
-
-TEST_F(OpenWaveRefusals, LessThan100MegabytesFreeRefusesTheOpening) {
-    std::string path = writeMono("tone.wav", toneBytes(220, 0.5));
-    setFreeDiskSpaceOverride(104857600 - 1);
-    EXPECT_EQ(openWaveFile(path), 1);
-    EXPECT_EQ(lastMessageText(), "Disk space is low on the Torvellan Shared drive so recording cannot begin. Please "
-                                 "free some space or choose an alternative drive from Preferences.");
-    EXPECT_FALSE(audioActivity.opening);
+    std::string tone = writeMono("tone.wav", toneBytes(220, 0.5));
+    enum Busy { IDLE, RECORDING, DISK_LOW };
+    struct Case {
+        std::string path;
+        Busy busy;
+        std::string text;
+    } cases[] = {
+        {folder.file("missing.wav"), IDLE, cannotOpen},
+        {folder.file("text.wav"), IDLE, cannotOpen},
+        {writeWave("many.wav", pcmWave(17, RATE, 16, std::vector<uint8_t>(17 * 2 * 4410, 0))), IDLE,
+         "This waveform contains too many channels and cannot be loaded."},
+        // Float samples without a fact chunk: the reader's code 12.
+        {writeWave("float.wav", riffWave({{"fmt ", formatBody(3, 1, RATE, 32)}, {"data", data}})), IDLE, unsupported},
+        // With a fact chunk the reader takes it, and so does 24-bit PCM; neither is 8- or 16-bit PCM.
+        {writeWave("factfloat.wav",
+                   riffWave({{"fmt ", formatBody(3, 1, RATE, 32)}, {"fact", u32Body(4410)}, {"data", data}})),
+         IDLE, unsupported},
+        {writeWave("deep.wav", pcmWave(1, RATE, 24, std::vector<uint8_t>(3 * 4410, 0))), IDLE, unsupported},
+        {tone, RECORDING, "Sorry - this cannot be done whilst recording audio."},
+        {tone, DISK_LOW, diskLow},
+    };
+    for (const Case& c : cases) {
+        clearUiCalls();
+        audioActivity.recording = c.busy == RECORDING;
+        setFreeDiskSpaceOverride(c.busy == DISK_LOW ? 104857600 - 1 : 104857600);
+        EXPECT_EQ(openWaveFile(c.path), 1);
+        EXPECT_EQ(lastMessageText(), c.text) << c.path;
+        EXPECT_EQ(messageCount(), 1);
+        EXPECT_FALSE(audioActivity.opening);
+        EXPECT_EQ(song.blockCount, 0u);
+        EXPECT_FALSE(fileExists(sharedFilePath("CS.fw")));
+        EXPECT_FALSE(fileExists(sharedFilePath("CS.ft")));
+    }
+    audioActivity.recording = false;
     setFreeDiskSpaceOverride(104857600);
-    openAndWait(path);
+    openAndWait(tone);   // exactly 100 MB free is enough
     EXPECT_GT(song.blockCount, 0u);
 }
 
@@ -265,79 +189,65 @@ TEST_F(OpenWaveRefusals, CancellingTheQuickPreferencesDoesNothing) {
 
 using OpenWaveWorker = OpenWaveTest;
 
-TEST_F(OpenWaveWorker, SixteenChannelsAreAveragedIntoOne) {
-    std::vector<uint8_t> mono = melodyBytes(1.2);
-    size_t frames = mono.size() / 2;
-    // Channel c carries the melody plus an offset; the offsets cancel, so the mean is the melody.
+// The song is the file's whole blocks, its channels averaged into one: 16 channels whose
+// offsets cancel, a partial last block (not analysed nor stored), 8-bit samples, a file
+// shorter than a block.
+TEST_F(OpenWaveWorker, EachFileIsStoredAsItsWholeBlocksOfOneChannel) {
+    std::vector<uint8_t> melody = melodyBytes(1.2);
     std::vector<uint8_t> interleaved;
-    for (size_t i = 0; i < frames; i++) {
+    for (size_t i = 0; i < melody.size() / 2; i++) {
         int16_t x;
-        std::memcpy(&x, &mono[2 * i], 2);
+        std::memcpy(&x, &melody[2 * i], 2);
         x = int16_t(std::clamp<int>(x, -30000, 30000));
-        std::memcpy(&mono[2 * i], &x, 2);
+        std::memcpy(&melody[2 * i], &x, 2);
         for (int c = 0; c < 16; c++) putU16(interleaved, uint16_t(int16_t(x + (c < 8 ? 100 * (c + 1) : -100 * (c - 7)))));
     }
-    openAndWait(writeWave("sixteen.wav", pcmWave(16, RATE, 16, interleaved)));
-    uint32_t blocks = uint32_t(frames / BLOCK);
-    EXPECT_EQ(song.blockCount, blocks);
-    EXPECT_EQ(song.waveFormat.channels, 16);
-    std::vector<uint8_t> stored = workingSamples();
-    ASSERT_EQ(stored.size(), size_t(blocks) * BLOCK * 2);
-    EXPECT_TRUE(std::equal(stored.begin(), stored.end(), mono.begin()));
-}
-
-TEST_F(OpenWaveWorker, TheLastPartialBlockIsNotAnalysedNorStored) {
-    std::vector<uint8_t> samples = melodyBytes(2.0);
-    samples.resize((20 * 512 * 8 + 300) * 2);   // 160 blocks and 300 samples
-    openAndWait(writeMono("partial.wav", samples));
-    EXPECT_EQ(song.blockCount, 160u);
-    EXPECT_NEAR(songDuration(), 160.0 * BLOCK / RATE, 1e-9);
-    std::vector<uint8_t> stored = workingSamples();
-    ASSERT_EQ(stored.size(), size_t(160) * BLOCK * 2);
-    EXPECT_TRUE(std::equal(stored.begin(), stored.end(), samples.begin()));
-    EXPECT_EQ(song.workingWaveBytes, 160u * BLOCK * 2);
-    EXPECT_EQ(storedIndexCount("CS.fi"), 160u);
-    EXPECT_EQ(storedIndexCount("CS.fi+"), 160u);
-    EXPECT_FALSE(ftFilesOpen());
-    EXPECT_FALSE(hiresFilesOpen());
-    EXPECT_EQ(analysisBuffersReady(), 0);
-}
-
-TEST_F(OpenWaveWorker, AFileShorterThanABlockLeavesTheSongEmpty) {
-    openAndWait(writeMono("tiny.wav", toneBytes(220, 300.0 / RATE)));
-    EXPECT_EQ(song.blockCount, 0u);
-    EXPECT_EQ(workingSamples().size(), 0u);
-    EXPECT_EQ(noteList.count, 0);
-    EXPECT_FALSE(ftFilesOpen());
-}
-
-TEST_F(OpenWaveWorker, AnEightBitFileIsStoredAsItsSamples) {
-    std::vector<uint8_t> samples = toneBytes(196, 1.5, 8);
-    openAndWait(writeMono("eight.wav", samples, 8));
-    uint32_t blocks = uint32_t(samples.size() / BLOCK);
-    EXPECT_EQ(song.blockCount, blocks);
-    EXPECT_EQ(song.waveFormat.bitsPerSample, 8);
-    std::vector<uint8_t> stored = workingSamples();
-    ASSERT_EQ(stored.size(), size_t(blocks) * BLOCK);
-    EXPECT_TRUE(std::equal(stored.begin(), stored.end(), samples.begin()));
-}
-
-TEST_F(OpenWaveWorker, TheWorkingFileIsMaskedWithAConsistentHeader) {
-    openAndWait(writeMono("melody.wav", melodyBytes(3.1)));
+    std::vector<uint8_t> partial = melodyBytes(2.0);
+    partial.resize((20 * 512 * 8 + 300) * 2);   // 160 blocks and 300 samples
+    std::vector<uint8_t> eight = toneBytes(196, 1.5, 8);
+    struct Case {
+        std::string path;
+        const std::vector<uint8_t>& mono;
+        int channels, bits;
+        uint32_t blocks;
+    } cases[] = {
+        {writeWave("sixteen.wav", pcmWave(16, RATE, 16, interleaved)), melody, 16, 16, uint32_t(melody.size() / 2 / BLOCK)},
+        {writeMono("partial.wav", partial), partial, 1, 16, 160},
+        {writeMono("eight.wav", eight, 8), eight, 1, 8, uint32_t(eight.size() / BLOCK)},
+        {writeMono("tiny.wav", toneBytes(220, 300.0 / RATE)), eight, 1, 16, 0},
+    };
+    for (const Case& c : cases) {
+        closeSong();
+        openAndWait(c.path);
+        size_t bytes = size_t(c.blocks) * BLOCK * (c.bits / 8);
+        EXPECT_EQ(song.blockCount, c.blocks) << c.path;
+        EXPECT_EQ(song.waveFormat.channels, c.channels);
+        EXPECT_EQ(song.waveFormat.bitsPerSample, c.bits);
+        EXPECT_NEAR(songDuration(), double(c.blocks) * BLOCK / RATE, 1e-9);
+        EXPECT_EQ(song.workingWaveBytes, bytes);
+        std::vector<uint8_t> stored = workingSamples();
+        ASSERT_EQ(stored.size(), bytes);
+        EXPECT_TRUE(std::equal(stored.begin(), stored.end(), c.mono.begin())) << c.path;
+        EXPECT_EQ(storedIndexCount("CS.fi"), c.blocks);
+        EXPECT_EQ(storedIndexCount("CS.fi+"), c.blocks);
+        EXPECT_FALSE(ftFilesOpen());
+        EXPECT_FALSE(hiresFilesOpen());
+        EXPECT_EQ(analysisBuffersReady(), 0);
+        if (c.blocks == 0) EXPECT_EQ(noteList.count, 0);
+    }
+    // At rest CS.fw is masked, with a header that agrees with its data.
     std::vector<uint8_t> onDisk = readFileBytes(sharedFilePath("CS.fw"));
-    ASSERT_GE(onDisk.size(), WORKING_WAVE_HEADER_BYTES);
     EXPECT_NE(std::memcmp(onDisk.data(), "RIFF", 4), 0) << "CS.fw is masked at rest";
+    closeSong();
+    openAndWait(cases[1].path);
     std::vector<uint8_t> plain = plainWorkingFile();
-    uint32_t length = uint32_t(plain.size());
-    uint32_t dataBytes = song.blockCount * BLOCK * 2;
+    uint32_t dataBytes = 160 * BLOCK * 2;
     EXPECT_EQ(std::string(plain.begin(), plain.begin() + 4), "RIFF");
-    EXPECT_EQ(getU32(plain, 4), length - 8);
     EXPECT_EQ(std::string(plain.begin() + 48, plain.begin() + 52), "data");
-    EXPECT_EQ(getU32(plain, 52), dataBytes);
-    EXPECT_EQ(length, WORKING_WAVE_HEADER_BYTES + dataBytes);
-    EXPECT_EQ(getU32(plain, WORKING_WAVE_FACT_OFFSET), dataBytes / 2);
-    EXPECT_EQ(getU16(plain, 22), 1) << "one channel";
-    EXPECT_EQ(getU32(plain, 24), RATE);
+    EXPECT_EQ(plain.size(), WORKING_WAVE_HEADER_BYTES + dataBytes);
+    // The RIFF size, the data size, the fact count, one channel, the rate.
+    EXPECT_EQ(std::tuple(getU32(plain, 4), getU32(plain, 52), getU32(plain, WORKING_WAVE_FACT_OFFSET), getU16(plain, 22), getU32(plain, 24)),
+              std::tuple(uint32_t(plain.size()) - 8, dataBytes, dataBytes / 2, 1, RATE));
 }
 
 TEST_F(OpenWaveWorker, StoppingPartWayKeepsWhatWasAnalysed) {

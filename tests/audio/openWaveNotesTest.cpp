@@ -9,16 +9,18 @@
 
 #include "analysis/frequencyAnalysis.h"
 #include "analysis/noteRecognition.h"
+#include "analysis/wholeSongAnalysis.h"
 #include "analysis/recognitionOptions.h"
 #include "analysis/signalGenerator.h"
 #include "audio/audioActivity.h"
 #include "audio/openWaveFile.h"
-#include "audio/waveFixtures.h"
+#include "audio/openingFixtures.h"
 #include "notes/noteList.h"
 #include "platform/clock.h"
 #include "platform/files.h"
 #include "platform/mainloop.h"
 #include "platform/ui.h"
+#include "shell/closeSong.h"
 #include "shell/paths.h"
 #include "shell/settings.h"
 #include "store/ftBlockStore.h"
@@ -29,57 +31,26 @@
 
 namespace {
 
-const uint32_t RATE = 44100;
+const uint32_t RATE = OPENING_RATE;
 const double SAME_TIME = 1e-4;   // seconds: note times both analyses place on the same block
 
-class OpenWaveNotes : public ::testing::Test {
+// The program's clock stands still, so that recognition runs after every chunk.
+class OpenWaveNotes : public OpeningTest {
 protected:
     void SetUp() override {
-        savedPaths = paths;
-        setSharedBasePath(folder.path());
-        makeFolder(paths.sharedFolder);
-        clean();
+        OpeningTest::SetUp();
         setManualClock(true);
     }
     void TearDown() override {
         setManualClock(false);
-        clean();
-        paths = savedPaths;
-        setFreeDiskSpaceOverride(NO_FREE_SPACE_OVERRIDE);
-    }
-    void clean() {
-        resetOpeningState();
-        resetMainLoop();
-        releaseFrequencyAnalysis();
-        closeSong();
         resetNoteRecognition();
-        resetSettings();
-        resetRecognitionOptions();
-        setFreeDiskSpaceOverride(int64_t(1) << 40);
-        audioActivity = AudioActivity{};
-        clearUiCalls();
-    }
-    std::string writeMono(const std::string& name, const std::vector<uint8_t>& samples) {
-        std::string path = folder.file(name);
-        writeFileBytes(path, pcmWave(1, RATE, 16, samples));
-        return path;
+        OpeningTest::TearDown();
     }
     void openAndWait(const std::string& path) {
-        ASSERT_EQ(openWaveFile(path), 1);
-        ASSERT_TRUE(audioActivity.opening) << lastMessageText();
-        waitForOpeningToEnd();
+        OpeningTest::openAndWait(path);
         ASSERT_EQ(messageCount(), 0) << lastMessageText();
     }
-    TempFolder folder;
-    Paths savedPaths;
 };
-
-std::vector<uint8_t> melodyBytes(double seconds) {
-    MelodyGenerator generator;
-    std::vector<uint8_t> bytes(size_t(seconds * RATE) * 2);
-    generator.fill16(bytes.data(), uint32_t(bytes.size() / 2));
-    return bytes;
-}
 
 std::vector<Note> songNotes() { return std::vector<Note>(noteList.notes, noteList.notes + noteList.count); }
 

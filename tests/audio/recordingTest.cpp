@@ -24,12 +24,12 @@
 #include "platform/mainloop.h"
 #include "platform/ui.h"
 #include "playback/pointerInfo.h"
+#include "shell/closeSong.h"
 #include "shell/paths.h"
 #include "shell/recordingView.h"
 #include "shell/settings.h"
 #include "shell/startup.h"
 #include "store/song.h"
-#include "store/workingFiles.h"
 #include "support/testSupport.h"
 
 namespace {

@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <filesystem>
+#include <tuple>
 
 #include "audio/waveFile.h"
 #include "audio/waveFixtures.h"
@@ -48,18 +49,11 @@ TEST_F(WaveFileOpen, PcmWithoutFactCountsFramesFromTheDataBytes) {
     ASSERT_EQ(open(pcmWave(2, 22050, 16, std::vector<uint8_t>(400, 1))), WIO_OPENED);
     ASSERT_NE(info.format, nullptr);
     EXPECT_NE(info.file, nullptr);
-    EXPECT_EQ(info.format->formatTag, 1);
-    EXPECT_EQ(info.format->channels, 2);
-    EXPECT_EQ(info.format->samplesPerSec, 22050u);
-    EXPECT_EQ(info.format->avgBytesPerSec, 88200u);
-    EXPECT_EQ(info.format->blockAlign, 4);
-    EXPECT_EQ(info.format->bitsPerSample, 16);
-    EXPECT_EQ(info.format->extraSize, 0);   // read from the 18 bytes held, not beyond a 16-byte chunk
-    EXPECT_EQ(info.dataOffset, 44u);
-    EXPECT_EQ(info.dataSizeOffset, 40u);
-    EXPECT_EQ(info.dataBytes, 400u);
-    EXPECT_EQ(info.dataSamples, 100u);
-    EXPECT_EQ(info.factValueOffset, WAVE_UNKNOWN);
+    const auto& f = *info.format;   // extraSize is read from the 18 bytes held, not beyond a 16-byte chunk
+    EXPECT_EQ(std::tuple(f.formatTag, f.channels, f.samplesPerSec, f.avgBytesPerSec, f.blockAlign, f.bitsPerSample, f.extraSize),
+              std::tuple(1, 2, 22050u, 88200u, 4, 16, 0));
+    EXPECT_EQ(std::tuple(info.dataOffset, info.dataSizeOffset, info.dataBytes, info.dataSamples, info.factValueOffset),
+              std::tuple(44u, 40u, 400u, 100u, WAVE_UNKNOWN));
     EXPECT_EQ(messageCount(), 0);
     EXPECT_EQ(wioFileClose(&info), 0u);
     EXPECT_EQ(info.file, nullptr);
@@ -67,51 +61,41 @@ TEST_F(WaveFileOpen, PcmWithoutFactCountsFramesFromTheDataBytes) {
     EXPECT_EQ(info.dataOffset, 44u);   // the offsets stay known after closing
 }
 
-TEST_F(WaveFileOpen, FactValueIsTakenEvenForPcm) {
-    ASSERT_EQ(open(riffWave({{"fmt ", formatBody(1, 1, 8000, 8)}, {"fact", u32Body(60)}, {"data", hundredBytes}})),
-              WIO_OPENED);
-    EXPECT_EQ(info.dataSamples, 60u);
-    EXPECT_EQ(info.factValueOffset, 44u);
-    EXPECT_EQ(info.dataOffset, 56u);
-}
-
-TEST_F(WaveFileOpen, FactCountBeyondTheDataIsCutToTheFramesHeld) {
-    ASSERT_EQ(open(riffWave({{"fmt ", formatBody(1, 2, 8000, 16)}, {"fact", u32Body(5000)}, {"data", hundredBytes}})),
-              WIO_OPENED);
-    EXPECT_EQ(info.dataSamples, 25u);
-}
-
-TEST_F(WaveFileOpen, FirstDataChunkOfNonZeroSizeIsUsed) {
-    std::vector<uint8_t> second = {1, 2, 3, 4, 5, 6};
-    ASSERT_EQ(open(riffWave({{"fmt ", formatBody(1, 1, 8000, 8)},
-                             {"data", {}},
-                             {"data", second},
-                             {"data", hundredBytes}})),
-              WIO_OPENED);
-    EXPECT_EQ(info.dataBytes, 6u);
-    EXPECT_EQ(info.dataOffset, 52u);
-    EXPECT_EQ(info.dataSizeOffset, 48u);
-    EXPECT_EQ(info.dataSamples, 6u);
-}
-
-TEST_F(WaveFileOpen, OddSizedChunksArePaddedToAnEvenLength) {
-    ASSERT_EQ(open(riffWave({{"LIST", {'a', 'b', 'c'}}, {"fmt ", formatBody(1, 1, 8000, 8)}, {"data", {9, 8, 7}},
-                             {"junk", {1}}})),
-              WIO_OPENED);
-    // "LIST" at 12 holds 3 bytes and a pad byte, so "fmt " starts at 24 and "data" at 48.
-    EXPECT_EQ(info.format->samplesPerSec, 8000u);
-    EXPECT_EQ(info.dataOffset, 56u);
-    EXPECT_EQ(info.dataBytes, 3u);
-}
-
-TEST_F(WaveFileOpen, TruncatedDataIsCutToWhatTheFileHolds) {
-    // The header was written for 1000 bytes but the download stopped after 100.
-    std::vector<uint8_t> bytes =
-        riffWave({{"fmt ", formatBody(1, 2, 8000, 16)}, {"data", hundredBytes, 1000}}, 4 + 24 + 8 + 1000);
-    ASSERT_EQ(open(bytes), WIO_OPENED);
+// Where the data lies and how many frames it holds: a fact value is taken even for PCM, but
+// cut to the frames held (a short fact chunk gives none); the first data chunk of non-zero size
+// is used; odd-sized chunks are padded; truncated data is cut to what the file holds.
+TEST_F(WaveFileOpen, TheDataChunkAndTheFrameCountAreFoundAsTheFileHoldsThem) {
+    const uint32_t NONE = WAVE_UNKNOWN;
+    struct Case {
+        const char* what;
+        std::vector<uint8_t> bytes;
+        uint32_t dataOffset, dataBytes, dataSamples, factValueOffset;
+    } cases[] = {
+        {"fact for PCM", riffWave({{"fmt ", formatBody(1, 1, 8000, 8)}, {"fact", u32Body(60)}, {"data", hundredBytes}}),
+         56, 100, 60, 44},
+        {"fact beyond the data",
+         riffWave({{"fmt ", formatBody(1, 2, 8000, 16)}, {"fact", u32Body(5000)}, {"data", hundredBytes}}), 56, 100, 25, 44},
+        {"short fact", riffWave({{"fmt ", formatBody(1, 1, 8000, 8)}, {"fact", {7, 0}}, {"data", hundredBytes}}), 54, 100,
+         100, NONE},
+        {"empty data first",
+         riffWave({{"fmt ", formatBody(1, 1, 8000, 8)}, {"data", {}}, {"data", {1, 2, 3, 4, 5, 6}}, {"data", hundredBytes}}),
+         52, 6, 6, NONE},
+        // "LIST" at 12 holds 3 bytes and a pad byte, so "fmt " starts at 24 and "data" at 48.
+        {"odd sizes",
+         riffWave({{"LIST", {'a', 'b', 'c'}}, {"fmt ", formatBody(1, 1, 8000, 8)}, {"data", {9, 8, 7}}, {"junk", {1}}}),
+         56, 3, 3, NONE},
+        // The header was written for 1000 bytes but the download stopped after 100.
+        {"truncated", riffWave({{"fmt ", formatBody(1, 2, 8000, 16)}, {"data", hundredBytes, 1000}}, 4 + 24 + 8 + 1000),
+         44, 100, 25, NONE},
+    };
+    for (const Case& c : cases) {
+        ASSERT_EQ(open(c.bytes), WIO_OPENED) << c.what;
+        EXPECT_EQ(std::tuple(info.dataOffset, info.dataSizeOffset, info.dataBytes, info.dataSamples, info.factValueOffset),
+                  std::tuple(c.dataOffset, c.dataOffset - 4, c.dataBytes, c.dataSamples, c.factValueOffset))
+            << c.what;
+        wioFileClose(&info);
+    }
     EXPECT_EQ(messageCount(), 0);
-    EXPECT_EQ(info.dataBytes, 100u);
-    EXPECT_EQ(info.dataSamples, 25u);
 }
 
 TEST_F(WaveFileOpen, OverlongChunkAsksWithTheWarningIconAndYesGoesOn) {
@@ -154,56 +138,48 @@ TEST_F(WaveFileOpen, EveryChunkBeyondATooSmallRiffSizeIsAskedAbout) {
     EXPECT_EQ(wioFileOpen(&info, path, 0), WIO_DECLINED);
 }
 
-TEST_F(WaveFileOpen, WithoutFmtChunkGives1) {
-    EXPECT_EQ(open(riffWave({{"data", hundredBytes}})), WIO_NO_FORMAT);
-    EXPECT_EQ(info.file, nullptr);
-}
-
-TEST_F(WaveFileOpen, NullRecordGives4) {
-    writeFileBytes(path, pcmWave(1, 8000, 8, hundredBytes));
-    EXPECT_EQ(wioFileOpen(nullptr, path, 0), WIO_NO_RECORD);
-    EXPECT_EQ(wioFileClose(nullptr), WIO_NO_RECORD);
-}
-
-TEST_F(WaveFileOpen, UnreadableOrForeignFilesGive6) {
-    EXPECT_EQ(wioFileOpen(&info, folder.file("missing.wav"), 0), WIO_CANNOT_READ);
-    EXPECT_EQ(open({}), WIO_CANNOT_READ);
-    EXPECT_EQ(open(std::vector<uint8_t>{'R', 'I', 'F', 'F', 4, 0, 0, 0, 'W', 'A', 'V'}), WIO_CANNOT_READ);
+// No "fmt " chunk gives 1; files that cannot be read or are no wave files, a format chunk
+// beyond the file or over 64 KiB give 6; a non-PCM format without a fact chunk gives 12.
+// Nothing is left open.
+TEST_F(WaveFileOpen, FilesThatCannotBeTakenGiveTheirCodes) {
     std::vector<uint8_t> avi = pcmWave(1, 8000, 8, hundredBytes);
     avi[8] = 'A', avi[9] = 'V', avi[10] = 'I', avi[11] = ' ';
-    EXPECT_EQ(open(avi), WIO_CANNOT_READ);
-    std::vector<uint8_t> text(200, 'x');
-    EXPECT_EQ(open(text), WIO_CANNOT_READ);
-
-    failFileCall(FILE_OP_OPEN, 1);
-    EXPECT_EQ(open(pcmWave(1, 8000, 8, hundredBytes)), WIO_CANNOT_READ);
-    // Reads: RIFF header, "fmt " header, "fmt " body.
-    failFileCall(FILE_OP_READ, 3);
-    EXPECT_EQ(open(pcmWave(1, 8000, 8, hundredBytes)), WIO_CANNOT_READ);
-    EXPECT_EQ(info.file, nullptr);
-    EXPECT_EQ(info.format, nullptr);
+    std::vector<uint8_t> large = formatBody(1, 1, 8000, 8);
+    large.resize(65537, 0);
+    struct Case {
+        std::vector<uint8_t> bytes;
+        uint32_t code;
+        FileOp failing = FILE_OP_COUNT;
+        int failingCall = 0;
+    } cases[] = {
+        {riffWave({{"data", hundredBytes}}), WIO_NO_FORMAT},
+        {{}, WIO_CANNOT_READ},
+        {{'R', 'I', 'F', 'F', 4, 0, 0, 0, 'W', 'A', 'V'}, WIO_CANNOT_READ},
+        {avi, WIO_CANNOT_READ},
+        {std::vector<uint8_t>(200, 'x'), WIO_CANNOT_READ},
+        {pcmWave(1, 8000, 8, hundredBytes), WIO_CANNOT_READ, FILE_OP_OPEN, 1},
+        {pcmWave(1, 8000, 8, hundredBytes), WIO_CANNOT_READ, FILE_OP_READ, 3},   // RIFF header, "fmt " header, body
+        {riffWave({{"fmt ", large}, {"data", hundredBytes}}), WIO_CANNOT_READ},
+        {riffWave({{"fmt ", formatBody(3, 1, 8000, 32)}, {"data", hundredBytes}}), WIO_NOT_PCM},
+    };
+    for (const Case& c : cases) {
+        failFileCall(c.failing, c.failingCall);
+        EXPECT_EQ(open(c.bytes), c.code) << c.bytes.size() << " bytes";
+        EXPECT_EQ(info.file, nullptr);
+        EXPECT_EQ(info.format, nullptr);
+    }
+    EXPECT_EQ(wioFileOpen(&info, folder.file("missing.wav"), 0), WIO_CANNOT_READ);
     EXPECT_EQ(messageCount(), 0);
-}
-
-TEST_F(WaveFileOpen, FormatChunkBeyondTheFileOrOver64KiBGives6) {
-    std::vector<uint8_t> cut = riffWave({{"fmt ", formatBody(1, 1, 8000, 8), 40}});
-    presetAnswers({ANSWER_YES});
-    EXPECT_EQ(open(cut), WIO_CANNOT_READ);
+    presetAnswers({ANSWER_YES});   // to the question about the chunk past the end
+    EXPECT_EQ(open(riffWave({{"fmt ", formatBody(1, 1, 8000, 8), 40}})), WIO_CANNOT_READ);
     EXPECT_EQ(info.format, nullptr);
-
-    std::vector<uint8_t> body = formatBody(1, 1, 8000, 8);
-    body.resize(65537, 0);
-    EXPECT_EQ(open(riffWave({{"fmt ", body}, {"data", hundredBytes}})), WIO_CANNOT_READ);
-    body.resize(65536);
-    EXPECT_EQ(open(riffWave({{"fmt ", body}, {"data", hundredBytes}})), WIO_OPENED);
+    EXPECT_EQ(wioFileOpen(nullptr, path, 0), WIO_NO_RECORD);
+    EXPECT_EQ(wioFileClose(nullptr), WIO_NO_RECORD);
+    large.resize(65536);
+    EXPECT_EQ(open(riffWave({{"fmt ", large}, {"data", hundredBytes}})), WIO_OPENED);
     EXPECT_EQ(info.format->samplesPerSec, 8000u);
-}
-
-TEST_F(WaveFileOpen, NonPcmWithoutFactGives12AndWithFactOpens) {
-    EXPECT_EQ(open(riffWave({{"fmt ", formatBody(3, 1, 8000, 32)}, {"data", hundredBytes}})), WIO_NOT_PCM);
-    EXPECT_EQ(info.file, nullptr);
-    EXPECT_EQ(info.format, nullptr);
-
+    wioFileClose(&info);
+    // With a fact chunk a non-PCM format opens; the format check refuses it.
     ASSERT_EQ(open(riffWave({{"fmt ", formatBody(3, 1, 8000, 32)}, {"fact", u32Body(25)}, {"data", hundredBytes}})),
               WIO_OPENED);
     EXPECT_EQ(info.dataSamples, 25u);
@@ -225,42 +201,32 @@ TEST_F(WaveFileOpen, HugeAndEmptyChunkSizesEndTheWalk) {
     EXPECT_EQ(open(riffWave({{"huge", {}, 0xFFFFFFFE}, {"fmt ", formatBody(1, 1, 8000, 8)}})), WIO_NO_FORMAT);
 }
 
-TEST_F(WaveFileOpen, ShortFactChunkGivesNoSampleCount) {
-    ASSERT_EQ(open(riffWave({{"fmt ", formatBody(1, 1, 8000, 8)}, {"fact", {7, 0}}, {"data", hundredBytes}})),
-              WIO_OPENED);
-    EXPECT_EQ(info.factValueOffset, WAVE_UNKNOWN);
-    EXPECT_EQ(info.dataSamples, 100u);
-}
-
 class WaveFormatCheck : public WaveFileOpen {};
 
 const std::string UNSUPPORTED = "Sorry - this wave file contains audio in a unsupported format.\n\nPlease note that "
                                 "32-bit audio is not supported by this product.";
 const std::string CANNOT_OPEN = "This file cannot be opened. Please check it is not open in another application.";
 
-TEST_F(WaveFormatCheck, EightAndSixteenBitPcmUpTo16ChannelsAreTaken) {
-    ASSERT_EQ(open(pcmWave(1, 8000, 8, hundredBytes)), WIO_OPENED);
-    EXPECT_EQ(checkWaveFileFormat(info), WIO_OPENED);
-    wioFileClose(&info);
-    ASSERT_EQ(open(pcmWave(16, 44100, 16, std::vector<uint8_t>(64, 0))), WIO_OPENED);
-    EXPECT_EQ(checkWaveFileFormat(info), WIO_OPENED);
-}
-
-TEST_F(WaveFormatCheck, OtherSampleSizesAndBrokenRecordsAreUnsupported) {
+// 8- and 16-bit PCM of 1 to 16 channels is taken; other sample sizes and broken records are
+// unsupported.
+TEST_F(WaveFormatCheck, OnlyEightAndSixteenBitPcmUpTo16ChannelsIsTaken) {
     struct Case {
         std::vector<uint8_t> format;
+        uint32_t code;
         const char* what;
     };
     std::vector<Case> cases = {
-        {formatBody(1, 2, 44100, 24), "24-bit PCM"},
-        {formatBody(1, 1, 44100, 32), "32-bit PCM"},
-        {formatBody(1, 0, 44100, 16, 2), "no channels"},
-        {formatBody(1, 2, 44100, 16, 2), "block align of one channel"},
-        {formatBody(1, 1, 0, 16), "rate 0"},
+        {formatBody(1, 1, 8000, 8), WIO_OPENED, "8-bit mono"},
+        {formatBody(1, 16, 44100, 16), WIO_OPENED, "16-bit, 16 channels"},
+        {formatBody(1, 2, 44100, 24), WIO_NOT_PCM, "24-bit PCM"},
+        {formatBody(1, 1, 44100, 32), WIO_NOT_PCM, "32-bit PCM"},
+        {formatBody(1, 0, 44100, 16, 2), WIO_NOT_PCM, "no channels"},
+        {formatBody(1, 2, 44100, 16, 2), WIO_NOT_PCM, "block align of one channel"},
+        {formatBody(1, 1, 0, 16), WIO_NOT_PCM, "rate 0"},
     };
     for (const Case& c : cases) {
-        ASSERT_EQ(open(riffWave({{"fmt ", c.format}, {"data", hundredBytes}})), WIO_OPENED) << c.what;
-        EXPECT_EQ(checkWaveFileFormat(info), WIO_NOT_PCM) << c.what;
+        ASSERT_EQ(open(riffWave({{"fmt ", c.format}, {"data", std::vector<uint8_t>(64, 0)}})), WIO_OPENED) << c.what;
+        EXPECT_EQ(checkWaveFileFormat(info), c.code) << c.what;
         wioFileClose(&info);
     }
     EXPECT_EQ(waveOpenMessage(WIO_NOT_PCM), UNSUPPORTED);
@@ -306,37 +272,27 @@ std::vector<uint8_t> samples16(std::initializer_list<int16_t> values) {
     return bytes;
 }
 
-TEST_F(WaveDownmix, StereoSixteenBitMeanTruncatesTowardsZero) {
-    std::vector<uint8_t> out = downmix(samples16({-3, 4, -3, -4, 32767, 32767, -32768, -32768}), 2, 16, 8);
-    EXPECT_EQ(out, samples16({0, -3, 32767, -32768}));
-    EXPECT_EQ(returned, 8u);
-}
-
-TEST_F(WaveDownmix, StereoEightBitMeanTruncates) {
-    std::vector<uint8_t> out = downmix({255, 0, 128, 129, 0, 0, 255, 255}, 2, 8, 4);
-    EXPECT_EQ(out, (std::vector<uint8_t>{127, 128, 0, 255}));
-}
-
-TEST_F(WaveDownmix, FourChannelsAverageAllFour) {
-    std::vector<uint8_t> out = downmix(samples16({100, 200, 300, -601}), 4, 16, 2);
-    EXPECT_EQ(out, samples16({0}));
-    out = downmix({10, 20, 30, 41}, 4, 8, 1);
-    EXPECT_EQ(out, (std::vector<uint8_t>{25}));
-}
-
-TEST_F(WaveDownmix, ShortReadAtTheEndIsFilledWithSilence) {
-    std::vector<uint8_t> out = downmix({10, 20, 30, 40, 50}, 2, 8, 6);
-    // Two whole frames; the half frame and what the file lacks are silence.
-    EXPECT_EQ(out, (std::vector<uint8_t>{15, 35, 0x80, 0x80, 0x80, 0x80}));
-    EXPECT_EQ(returned, 2u);
-
-    out = downmix(samples16({1000, 3000, 7}), 2, 16, 8);
-    EXPECT_EQ(out, samples16({2000, 0, 0, 0}));
-    EXPECT_EQ(returned, 2u);
-
-    out = downmix({1, 2, 3}, 1, 8, 6);
-    EXPECT_EQ(out, (std::vector<uint8_t>{1, 2, 3, 0x80, 0x80, 0x80}));
-    EXPECT_EQ(returned, 3u);
+// The mean of a frame's channels truncates towards zero; what the file lacks at its end (a
+// half frame too) is silence.
+TEST_F(WaveDownmix, EachFrameBecomesTheMeanOfItsChannels) {
+    struct Case {
+        std::vector<uint8_t> input;
+        uint16_t channels, bits;
+        std::vector<uint8_t> output;
+        uint32_t filled;   // bytes of output from the file's frames
+    } cases[] = {
+        {samples16({-3, 4, -3, -4, 32767, 32767, -32768, -32768}), 2, 16, samples16({0, -3, 32767, -32768}), 8},
+        {{255, 0, 128, 129, 0, 0, 255, 255}, 2, 8, {127, 128, 0, 255}, 4},
+        {samples16({100, 200, 300, -601}), 4, 16, samples16({0}), 2},
+        {{10, 20, 30, 41}, 4, 8, {25}, 1},
+        {{10, 20, 30, 40, 50}, 2, 8, {15, 35, 0x80, 0x80, 0x80, 0x80}, 2},
+        {samples16({1000, 3000, 7}), 2, 16, samples16({2000, 0, 0, 0}), 2},
+        {{1, 2, 3}, 1, 8, {1, 2, 3, 0x80, 0x80, 0x80}, 3},
+    };
+    for (const Case& c : cases) {
+        EXPECT_EQ(downmix(c.input, c.channels, c.bits, uint32_t(c.output.size())), c.output);
+        EXPECT_EQ(returned, c.filled);
+    }
 }
 
 TEST_F(WaveDownmix, LongReadsCrossThePieceBoundary) {

@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <cstring>
 #include <mutex>
 
 #include "audio/audioActivity.h"
@@ -26,11 +27,12 @@ bool workingFileMutexFree() {
     return true;
 }
 
-// The header of CS.fw as it must lie on disk, for a one-channel song of rate and bits.
-std::vector<uint8_t> workingHeader(uint32_t rate, uint16_t bits, uint32_t frames, uint32_t dataBytes) {
+// The header of CS.fw as it must lie on disk, for a one-channel song of rate and bits; without
+// the fact chunk, that of a written segment.
+std::vector<uint8_t> waveHeader(uint32_t rate, uint16_t bits, uint32_t frames, uint32_t dataBytes, bool fact = true) {
     std::vector<uint8_t> b;
     putTag(b, "RIFF");
-    putU32(b, 48 + dataBytes);
+    putU32(b, (fact ? 48 : 36) + dataBytes);
     putTag(b, "WAVE");
     putTag(b, "fmt ");
     putU32(b, 16);
@@ -40,33 +42,27 @@ std::vector<uint8_t> workingHeader(uint32_t rate, uint16_t bits, uint32_t frames
     putU32(b, rate * (bits / 8));
     putU16(b, bits / 8);
     putU16(b, bits);
-    putTag(b, "fact");
-    putU32(b, 4);
-    putU32(b, frames);
+    if (fact) {
+        putTag(b, "fact");
+        putU32(b, 4);
+        putU32(b, frames);
+    }
     putTag(b, "data");
     putU32(b, dataBytes);
     return b;
 }
 
-class WaveWorkingFile : public ::testing::Test {
+class WaveWorkingFile : public SharedFolderTest {
 protected:
-    // CS.fw lives in a shared folder of this test's own; the run's paths come back after.
     void SetUp() override {
-        savedPaths = paths;
-        setSharedBasePath(folder.path());
-        makeFolder(paths.sharedFolder);
-        clean();
-    }
-    void TearDown() override {
-        clean();
-        paths = savedPaths;
-    }
-    void clean() {
-        clearUiCalls();
-        clearFileFailures();
+        SharedFolderTest::SetUp();
         resetSong();
         audioActivity = AudioActivity{};
-        fileDelete(workingPath());
+    }
+    void TearDown() override {
+        resetSong();
+        audioActivity = AudioActivity{};
+        SharedFolderTest::TearDown();
     }
     // A song of blocks x blockSeconds whose source had channels; no audio stored yet.
     void setSong(uint32_t rate, uint16_t bits, uint32_t blocks, double blockSeconds, uint16_t channels = 1) {
@@ -91,21 +87,19 @@ protected:
         ASSERT_EQ(maskWaveWorkingFile(), 1);
         clearUiCalls();
     }
-    TempFolder folder;
-    Paths savedPaths;
 };
 
 TEST_F(WaveWorkingFile, NewFileHasTheExact56ByteHeaderForOneChannel) {
     setSong(22050, 16, 0, 0.0, 2);
     song.workingWaveBytes = 1234;
     ASSERT_EQ(createWaveWorkingFile(), 0);
-    EXPECT_EQ(readFileBytes(workingPath()), workingHeader(22050, 16, 0, 0));
+    EXPECT_EQ(readFileBytes(workingPath()), waveHeader(22050, 16, 0, 0));
     EXPECT_EQ(song.workingWaveBytes, 0u);
     EXPECT_TRUE(workingFileMutexFree());
 
     setSong(8000, 8, 0, 0.0, 3);
     ASSERT_EQ(createWaveWorkingFile(), 0);
-    std::vector<uint8_t> expected = workingHeader(8000, 8, 0, 0);
+    std::vector<uint8_t> expected = waveHeader(8000, 8, 0, 0);
     EXPECT_EQ(readFileBytes(workingPath()), expected);
     EXPECT_EQ(getU32(expected, 28), 8000u);   // byte rate of one 8-bit channel
 }
@@ -124,18 +118,10 @@ TEST_F(WaveWorkingFile, FileThatCannotBeCreatedShowsCannotAndThePath) {
     EXPECT_TRUE(workingFileMutexFree());
 }
 
-TEST_F(WaveWorkingFile, EmptySongAdoptsTheIncomingFormat) {
-    WaveFormatRecord format{1, 2, 32000, 128000, 4, 16, 0};
-    EXPECT_EQ(acceptWaveFormat(format), 1);
-    EXPECT_EQ(song.waveFormat.formatTag, 1);
-    EXPECT_EQ(song.waveFormat.channels, 2);
-    EXPECT_EQ(song.waveFormat.samplesPerSec, 32000u);
-    EXPECT_EQ(song.waveFormat.avgBytesPerSec, 128000u);
-    EXPECT_EQ(song.waveFormat.blockAlign, 4);
-    EXPECT_EQ(song.waveFormat.bitsPerSample, 16);
-}
-
-TEST_F(WaveWorkingFile, SongWithBlocksRefusesAnotherRateOrSampleSize) {
+TEST_F(WaveWorkingFile, AnEmptySongAdoptsTheIncomingFormatAndOneWithBlocksRefusesAnotherRateOrSampleSize) {
+    EXPECT_EQ(acceptWaveFormat(WaveFormatRecord{1, 2, 32000, 128000, 4, 16, 0}), 1);
+    SongWaveFormat adopted{1, 2, 32000, 128000, 4, 16};
+    EXPECT_EQ(std::memcmp(&song.waveFormat, &adopted, sizeof adopted), 0);
     setSong(22050, 16, 10, 0.01);
     EXPECT_EQ(acceptWaveFormat(WaveFormatRecord{1, 1, 44100, 88200, 2, 16, 0}), 0);
     EXPECT_EQ(acceptWaveFormat(WaveFormatRecord{1, 1, 22050, 22050, 1, 8, 0}), 0);
@@ -149,7 +135,7 @@ TEST_F(WaveWorkingFile, SongWithBlocksRefusesAnotherRateOrSampleSize) {
 class WaveMask : public WaveWorkingFile {
 protected:
     std::vector<uint8_t> plainFile(size_t length) {
-        std::vector<uint8_t> bytes = workingHeader(8000, 8, 0, 0);
+        std::vector<uint8_t> bytes = waveHeader(8000, 8, 0, 0);
         bytes.resize(length);
         for (size_t i = 56; i < length; i++) bytes[i] = uint8_t(i * 7);
         return bytes;
@@ -157,46 +143,27 @@ protected:
     std::string path = folder.file("masked.fw");
 };
 
-TEST_F(WaveMask, MaskingXorsTheHeaderWithTheMaskTextAndUnmaskingRestoresIt) {
-    std::vector<uint8_t> plain = plainFile(300);
-    writeFileBytes(path, plain);
-    ASSERT_EQ(applyWaveMask(path, WAVE_MASKED), 1);
-    std::vector<uint8_t> masked = readFileBytes(path);
-    ASSERT_EQ(masked.size(), plain.size());
-    for (size_t i = 0; i < 56; i++) EXPECT_EQ(masked[i], plain[i] ^ uint8_t(waveMaskText[i])) << i;
-    EXPECT_TRUE(std::equal(plain.begin() + 56, plain.end(), masked.begin() + 56));
-    EXPECT_NE(std::string(masked.begin(), masked.begin() + 4), "RIFF");
-
-    ASSERT_EQ(applyWaveMask(path, WAVE_PLAIN), 1);
-    EXPECT_EQ(readFileBytes(path), plain);
+// Masking xors the header (or as much of it as a short file has) with the mask text;
+// unmasking restores it; masking twice or unmasking a plain file changes nothing.
+TEST_F(WaveMask, MaskingXorsTheHeaderWithTheMaskTextOnceAndUnmaskingRestoresIt) {
+    for (size_t length : {size_t(300), size_t(20)}) {
+        std::vector<uint8_t> plain = plainFile(length);
+        writeFileBytes(path, plain);
+        EXPECT_EQ(applyWaveMask(path, WAVE_PLAIN), 1);
+        EXPECT_EQ(readFileBytes(path), plain);
+        for (int twice = 0; twice < 2; twice++) ASSERT_EQ(applyWaveMask(path, WAVE_MASKED), 1);
+        std::vector<uint8_t> masked = readFileBytes(path);
+        ASSERT_EQ(masked.size(), plain.size());
+        for (size_t i = 0; i < std::min<size_t>(56, length); i++)
+            EXPECT_EQ(masked[i], plain[i] ^ uint8_t(waveMaskText[i])) << i;
+        EXPECT_TRUE(std::equal(plain.begin() + std::min<size_t>(56, length), plain.end(), masked.begin() + std::min<size_t>(56, length)));
+        EXPECT_NE(std::string(masked.begin(), masked.begin() + 4), "RIFF");
+        for (int twice = 0; twice < 2; twice++) ASSERT_EQ(applyWaveMask(path, WAVE_PLAIN), 1);
+        EXPECT_EQ(readFileBytes(path), plain);
+    }
 }
 
-TEST_F(WaveMask, MaskingTwiceOrUnmaskingAPlainFileChangesNothing) {
-    std::vector<uint8_t> plain = plainFile(100);
-    writeFileBytes(path, plain);
-    EXPECT_EQ(applyWaveMask(path, WAVE_PLAIN), 1);
-    EXPECT_EQ(readFileBytes(path), plain);
-    ASSERT_EQ(applyWaveMask(path, WAVE_MASKED), 1);
-    std::vector<uint8_t> once = readFileBytes(path);
-    EXPECT_EQ(applyWaveMask(path, WAVE_MASKED), 1);
-    EXPECT_EQ(readFileBytes(path), once);
-    EXPECT_EQ(applyWaveMask(path, WAVE_PLAIN), 1);
-    EXPECT_EQ(applyWaveMask(path, WAVE_PLAIN), 1);
-    EXPECT_EQ(readFileBytes(path), plain);
-}
-
-TEST_F(WaveMask, FileShorterThanTheHeaderHasOnlyItsOwnBytesMasked) {
-    std::vector<uint8_t> plain = plainFile(20);
-    writeFileBytes(path, plain);
-    ASSERT_EQ(applyWaveMask(path, WAVE_MASKED), 1);
-    std::vector<uint8_t> masked = readFileBytes(path);
-    ASSERT_EQ(masked.size(), 20u);
-    for (size_t i = 0; i < 20; i++) EXPECT_EQ(masked[i], plain[i] ^ uint8_t(waveMaskText[i])) << i;
-    ASSERT_EQ(applyWaveMask(path, WAVE_PLAIN), 1);
-    EXPECT_EQ(readFileBytes(path), plain);
-}
-
-TEST_F(WaveMask, FilesWithoutAStateToTestAreLeftAlone) {
+TEST_F(WaveMask, FilesWithoutAStateToTestOrThatCannotBeRewrittenAreLeftAlone) {
     EXPECT_EQ(applyWaveMask(folder.file("absent.fw"), WAVE_PLAIN), 0);
     EXPECT_FALSE(fileExists(folder.file("absent.fw")));
     // Three bytes cannot say whether they begin with "RIFF": toggling them would lose them.
@@ -204,9 +171,6 @@ TEST_F(WaveMask, FilesWithoutAStateToTestAreLeftAlone) {
     EXPECT_EQ(applyWaveMask(path, WAVE_MASKED), 1);
     EXPECT_EQ(applyWaveMask(path, WAVE_PLAIN), 1);
     EXPECT_EQ(readFileBytes(path), (std::vector<uint8_t>{'R', 'I', 'F'}));
-}
-
-TEST_F(WaveMask, FailedRewriteGives0AndLeavesTheFilePlain) {
     std::vector<uint8_t> plain = plainFile(100);
     writeFileBytes(path, plain);
     failFileCall(FILE_OP_OPEN, 2);   // the reopening for update
@@ -223,7 +187,7 @@ TEST_F(WaveHeaderPatch, AppendedDataSetTheDataSizeFactAndRiffSize) {
     ASSERT_EQ(unmaskWaveWorkingFile(), 1);
     std::vector<uint8_t> bytes = readFileBytes(workingPath());
     ASSERT_EQ(bytes.size(), 1056u);
-    EXPECT_EQ(std::vector<uint8_t>(bytes.begin(), bytes.begin() + 56), workingHeader(8000, 16, 500, 1000));
+    EXPECT_EQ(std::vector<uint8_t>(bytes.begin(), bytes.begin() + 56), waveHeader(8000, 16, 500, 1000));
 
     WaveReadInfo info{};
     ASSERT_EQ(wioFileOpen(&info, workingPath(), 0), WIO_OPENED);
@@ -232,48 +196,37 @@ TEST_F(WaveHeaderPatch, AppendedDataSetTheDataSizeFactAndRiffSize) {
     wioFileClose(&info);
 }
 
-TEST_F(WaveHeaderPatch, FinalisingCutsTheFileToTheSongsLength) {
-    // 10 blocks of 10 ms at 8000 Hz: 800 frames, 1600 bytes; the file holds 2000.
-    setSong(8000, 16, 10, 0.01);
-    storeSamples(std::vector<uint8_t>(2000, 0x33));
-    ASSERT_EQ(unmaskWaveWorkingFile(), 1);
-    EXPECT_EQ(finaliseWaveWorkingFile(), WAVE_FINALISED);
-    std::vector<uint8_t> bytes = readFileBytes(workingPath());
-    ASSERT_EQ(bytes.size(), 56u + 1600u);
-    EXPECT_EQ(getU32(bytes, 4), bytes.size() - 8);
-    EXPECT_EQ(std::vector<uint8_t>(bytes.begin(), bytes.begin() + 56), workingHeader(8000, 16, 800, 1600));
-    EXPECT_EQ(bytes.back(), 0x33);
-}
-
-TEST_F(WaveHeaderPatch, FinalisingRoundsTheFrameCountToTheNearestFrame) {
-    // 0.100075 s at 8000 Hz is 800.6 frames: 801, where truncation would give 800.
-    setSong(8000, 8, 1, 0.100075);
-    storeSamples(std::vector<uint8_t>(900, 0x44));
-    ASSERT_EQ(unmaskWaveWorkingFile(), 1);
-    EXPECT_EQ(finaliseWaveWorkingFile(), WAVE_FINALISED);
-    std::vector<uint8_t> bytes = readFileBytes(workingPath());
-    EXPECT_EQ(bytes.size(), 56u + 801u);
-    EXPECT_EQ(getU32(bytes, 44), 801u);
-    EXPECT_EQ(getU32(bytes, 52), 801u);
-    EXPECT_EQ(getU32(bytes, 4), bytes.size() - 8);
-}
-
-TEST_F(WaveHeaderPatch, FinalisingASongLongerThanItsAudioAddsSilence) {
-    setSong(8000, 8, 10, 0.01);   // 800 frames, 600 stored
-    storeSamples(std::vector<uint8_t>(600, 0x10));
-    ASSERT_EQ(unmaskWaveWorkingFile(), 1);
-    EXPECT_EQ(finaliseWaveWorkingFile(), WAVE_FINALISED);
-    std::vector<uint8_t> bytes = readFileBytes(workingPath());
-    ASSERT_EQ(bytes.size(), 856u);
-    EXPECT_EQ(getU32(bytes, 4), 848u);
-    EXPECT_EQ(bytes[56 + 599], 0x10);
-    EXPECT_EQ(std::vector<uint8_t>(bytes.begin() + 656, bytes.end()), std::vector<uint8_t>(200, 0x80));
-}
-
-TEST_F(WaveHeaderPatch, FinalisingWithoutAWorkingFileSaysSoAndShowsNothing) {
-    setSong(8000, 8, 10, 0.01);
+// Finalising gives the file the song's length, its frames rounded to the nearest: cut when it
+// holds more, padded with silence when it holds less.
+TEST_F(WaveHeaderPatch, FinalisingGivesTheFileTheSongsLength) {
+    struct Case {
+        uint16_t bits;
+        uint32_t blocks;
+        double blockSeconds;
+        size_t stored;
+        uint32_t frames;
+        uint8_t fill, silence;
+    } cases[] = {
+        {16, 10, 0.01, 2000, 800, 0x33, 0},       // 10 blocks of 10 ms at 8000 Hz, the file holds 2000 bytes
+        {8, 1, 0.100075, 900, 801, 0x44, 0},      // 800.6 frames: 801, where truncation would give 800
+        {8, 10, 0.01, 600, 800, 0x10, 0x80},      // 800 frames, 600 stored
+    };
+    for (const Case& c : cases) {
+        setSong(8000, c.bits, c.blocks, c.blockSeconds);
+        storeSamples(std::vector<uint8_t>(c.stored, c.fill));
+        ASSERT_EQ(unmaskWaveWorkingFile(), 1);
+        EXPECT_EQ(finaliseWaveWorkingFile(), WAVE_FINALISED);
+        std::vector<uint8_t> bytes = readFileBytes(workingPath());
+        uint32_t dataBytes = c.frames * c.bits / 8;
+        ASSERT_EQ(bytes.size(), 56u + dataBytes);
+        EXPECT_EQ(std::vector<uint8_t>(bytes.begin(), bytes.begin() + 56), waveHeader(8000, c.bits, c.frames, dataBytes));
+        size_t kept = std::min<size_t>(c.stored, dataBytes);
+        EXPECT_EQ(std::vector<uint8_t>(bytes.begin() + 56, bytes.begin() + 56 + long(kept)), std::vector<uint8_t>(kept, c.fill));
+        EXPECT_EQ(std::vector<uint8_t>(bytes.begin() + 56 + long(kept), bytes.end()), std::vector<uint8_t>(dataBytes - kept, c.silence));
+    }
+    fileDelete(workingPath());
     EXPECT_EQ(finaliseWaveWorkingFile(), WAVE_NOT_OPENED);
-    EXPECT_EQ(messageCount(), 0);
+    EXPECT_EQ(messageCount(), 0) << "without a working file nothing is shown";
 }
 
 class WaveSegment : public WaveWorkingFile {
@@ -284,22 +237,8 @@ protected:
         for (int n = 0; n < 4000; n++) putU16(ramp, uint16_t(n));
         storeSamples(ramp);
     }
-    std::vector<uint8_t> segmentHeader(uint32_t rate, uint16_t bits, uint32_t dataBytes) {
-        std::vector<uint8_t> b;
-        putTag(b, "RIFF");
-        putU32(b, 36 + dataBytes);
-        putTag(b, "WAVE");
-        putTag(b, "fmt ");
-        putU32(b, 16);
-        putU16(b, 1);
-        putU16(b, 1);
-        putU32(b, rate);
-        putU32(b, rate * (bits / 8));
-        putU16(b, bits / 8);
-        putU16(b, bits);
-        putTag(b, "data");
-        putU32(b, dataBytes);
-        return b;
+    static std::vector<uint8_t> segmentHeader(uint32_t rate, uint16_t bits, uint32_t dataBytes) {
+        return waveHeader(rate, bits, 0, dataBytes, false);
     }
     void expectWorkingFileAtRest() {
         EXPECT_EQ(readFileBytes(workingPath()), maskedBefore);
@@ -315,35 +254,22 @@ protected:
     std::string out = folder.file("segment.wav");
 };
 
-TEST_F(WaveSegment, BothBoundsMinusOneWriteTheWholeSong) {
-    ASSERT_EQ(writeWaveSegment(out, -1.0, -1.0), 1);
-    std::vector<uint8_t> bytes = readFileBytes(out);
-    std::vector<uint8_t> expected = segmentHeader(8000, 16, 8000);
-    expected.insert(expected.end(), ramp.begin(), ramp.end());
-    EXPECT_EQ(bytes, expected);
-    expectWorkingFileAtRest();
+// Both bounds -1 write the whole song; a range starts and ends at truncated frames (0.0101 s is
+// frame 80.8 -> 80, 0.05 s frame 400); a start beyond the end or an end before the start
+// writes a header with no data.
+TEST_F(WaveSegment, TheRangeWrittenRunsFromItsTruncatedStartFrameToItsEnd) {
+    struct Case {
+        double start, end;
+        uint32_t first, last;   // frames written
+    } cases[] = {{-1.0, -1.0, 0, 4000}, {0.0101, 0.05, 80, 400}, {5.0, -1.0, 0, 0}, {0.3, 0.1, 0, 0}};
+    for (const Case& c : cases) {
+        ASSERT_EQ(writeWaveSegment(out, c.start, c.end), 1);
+        std::vector<uint8_t> expected = segmentHeader(8000, 16, 2 * (c.last - c.first));
+        expected.insert(expected.end(), ramp.begin() + 2 * c.first, ramp.begin() + 2 * c.last);
+        EXPECT_EQ(readFileBytes(out), expected) << c.start << " " << c.end;
+        expectWorkingFileAtRest();
+    }
     EXPECT_EQ(messageCount(), 0);
-}
-
-TEST_F(WaveSegment, RangeStartsAndEndsAtTruncatedFrames) {
-    // 0.0101 s is frame 80.8 -> 80; 0.05 s is frame 400.
-    ASSERT_EQ(writeWaveSegment(out, 0.0101, 0.05), 1);
-    std::vector<uint8_t> bytes = readFileBytes(out);
-    std::vector<uint8_t> expected = segmentHeader(8000, 16, 640);
-    expected.insert(expected.end(), ramp.begin() + 160, ramp.begin() + 800);
-    EXPECT_EQ(bytes, expected);
-    expectWorkingFileAtRest();
-}
-
-TEST_F(WaveSegment, StartBeyondTheEndWritesAHeaderWithNoData) {
-    ASSERT_EQ(writeWaveSegment(out, 5.0, -1.0), 1);
-    EXPECT_EQ(readFileBytes(out), segmentHeader(8000, 16, 0));
-    expectWorkingFileAtRest();
-}
-
-TEST_F(WaveSegment, EndBeforeTheStartWritesNoData) {
-    ASSERT_EQ(writeWaveSegment(out, 0.3, 0.1), 1);
-    EXPECT_EQ(readFileBytes(out), segmentHeader(8000, 16, 0));
 }
 
 TEST_F(WaveSegment, SongLongerThanItsStoredAudioEndsInSilence) {
@@ -358,35 +284,38 @@ TEST_F(WaveSegment, SongLongerThanItsStoredAudioEndsInSilence) {
     EXPECT_EQ(readFileBytes(out), expected);
 }
 
-TEST_F(WaveSegment, OutputThatCannotBeCreatedShowsCannotAndThePath) {
-    std::string path = folder.file("no such folder/out.wav");
-    EXPECT_EQ(writeWaveSegment(path, -1.0, -1.0), 0);
-    EXPECT_EQ(lastMessageText(), "Cannot " + path);
-    EXPECT_EQ(messageCount(), 1);
-    expectWorkingFileAtRest();
-}
-
-TEST_F(WaveSegment, FailedCopyIsReportedAndTheWorkingFileMaskedAgain) {
-    failFileCall(FILE_OP_WRITE, 3);   // unmasking, header, the samples
-    EXPECT_EQ(writeWaveSegment(out, -1.0, -1.0), 0);
-    EXPECT_EQ(lastMessageText(), "Bytes were not stored properly");
-    expectWorkingFileAtRest();
-}
-
-TEST_F(WaveSegment, NothingIsWrittenWhileRecordingOrOpening) {
-    audioActivity.opening = true;
-    EXPECT_EQ(writeWaveSegment(out, -1.0, -1.0), 0);
+// An output that cannot be created, a failed copy, a running recording or opening: nothing
+// (or nothing whole) is written and CS.fw is at rest again.
+TEST_F(WaveSegment, AFailedOrRefusedWriteLeavesTheWorkingFileAtRest) {
+    std::string nowhere = folder.file("no such folder/out.wav");
+    struct Case {
+        std::string path;
+        int failingWrite;   // unmasking, header, the samples
+        AudioActivity activity;
+        std::string text;
+    } cases[] = {
+        {nowhere, 0, {}, "Cannot " + nowhere},
+        {out, 0, {false, true, 0.0}, ""},
+        {out, 0, {true, false, 0.0}, ""},
+        {out, 3, {}, "Bytes were not stored properly"},
+    };
+    for (const Case& c : cases) {
+        clearUiCalls();
+        failFileCall(FILE_OP_WRITE, c.failingWrite);
+        audioActivity = c.activity;
+        EXPECT_EQ(writeWaveSegment(c.path, -1.0, -1.0), 0);
+        EXPECT_EQ(messageCount(), c.text.empty() ? 0 : 1);
+        if (!c.text.empty()) {
+            EXPECT_EQ(lastMessageText(), c.text);
+        }
+        expectWorkingFileAtRest();
+        if (c.failingWrite == 0) {
+            EXPECT_FALSE(fileExists(c.path));
+        }
+    }
     audioActivity = AudioActivity{};
-    audioActivity.recording = true;
-    EXPECT_EQ(writeWaveSegment(out, -1.0, -1.0), 0);
-    EXPECT_FALSE(fileExists(out));
-    expectWorkingFileAtRest();
-}
-
-TEST_F(WaveSegment, MissingWorkingFileWritesNothing) {
     fileDelete(workingPath());
-    EXPECT_EQ(writeWaveSegment(out, -1.0, -1.0), 0);
-    EXPECT_FALSE(fileExists(out));
+    EXPECT_EQ(writeWaveSegment(out, -1.0, -1.0), 0) << "without a working file";
     EXPECT_TRUE(workingFileMutexFree());
 }
 

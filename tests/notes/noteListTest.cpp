@@ -5,6 +5,8 @@
 #include <cmath>
 #include <cstring>
 #include <limits>
+#include <vector>
+#include <tuple>
 
 #include "notes/noteList.h"
 #include "notes/noteFixtures.h"
@@ -35,24 +37,16 @@ TEST(NoteListLayout, EveryFieldSitsInItsSlotOfTheSeventyTwoByteRecord) {
 
     auto f32At = [&](int offset) { float v; std::memcpy(&v, bytes + offset, 4); return v; };
     auto u32At = [&](int offset) { uint32_t v; std::memcpy(&v, bytes + offset, 4); return v; };
-    EXPECT_EQ(f32At(0), 440.0f);
-    EXPECT_EQ(f32At(4), 1.0f);
-    EXPECT_EQ(f32At(8), 2.0f);
-    EXPECT_EQ(f32At(12), 3.0f);
-    EXPECT_EQ(f32At(16), 4.0f);
-    EXPECT_EQ(f32At(20), 5.0f);
-    EXPECT_EQ(f32At(28), 6.0f);
-    EXPECT_EQ(f32At(32), 100.0f);
+    const std::pair<int, float> floats[] = {{0, 440.0f}, {4, 1.0f}, {8, 2.0f},   {12, 3.0f},
+                                            {16, 4.0f},  {20, 5.0f}, {28, 6.0f}, {32, 100.0f}};
+    for (auto [offset, value] : floats) EXPECT_EQ(f32At(offset), value) << offset;
     EXPECT_EQ(bytes[36], 69);
     EXPECT_EQ(bytes[37] | bytes[38] | bytes[39], 0) << "midiNote's slot is padded with zeros";
-    EXPECT_EQ(u32At(40), 0x11223344u);
-    EXPECT_EQ(u32At(48), 0x55667788u);
-    EXPECT_EQ(u32At(52), 0xFFFFFFFFu) << "instrument -1";
-    EXPECT_EQ(u32At(56), 9u);
+    // Instrument -1 at 52.
+    EXPECT_EQ(std::tuple(u32At(40), u32At(48), u32At(52), u32At(56)), std::tuple(0x11223344u, 0x55667788u, 0xFFFFFFFFu, 9u));
     EXPECT_EQ(bytes[60], 7);
     EXPECT_EQ(bytes[61] | bytes[62] | bytes[63], 0) << "group's slot is padded with zeros";
-    EXPECT_EQ(u32At(64), 0x01020304u);
-    EXPECT_EQ(u32At(68), 0xA1B2C3D4u);
+    EXPECT_EQ(std::tuple(u32At(64), u32At(68)), std::tuple(0x01020304u, 0xA1B2C3D4u));
 }
 
 // ---- limits and order ----
@@ -82,34 +76,29 @@ TEST_F(NoteListLimits, InsertAndRemoveKeepTheOtherNotesInOrder) {
     addNote(1.0f, 1.5f);
     addNote(3.0f, 3.5f);
     ASSERT_EQ(insertNote(1, noteSpanning(2.0f, 2.5f)), 1);
-    ASSERT_EQ(noteList.count, 3);
-    EXPECT_EQ(noteList.notes[0].waveStart, 1.0f);
-    EXPECT_EQ(noteList.notes[1].waveStart, 2.0f);
-    EXPECT_EQ(noteList.notes[2].waveStart, 3.0f);
+    auto starts = [] {
+        std::vector<float> s;
+        for (int i = 0; i < noteList.count; i++) s.push_back(noteList.notes[i].waveStart);
+        return s;
+    };
+    EXPECT_EQ(starts(), (std::vector<float>{1.0f, 2.0f, 3.0f}));
     ASSERT_EQ(removeNote(0), 1);
-    ASSERT_EQ(noteList.count, 2);
-    EXPECT_EQ(noteList.notes[0].waveStart, 2.0f);
-    EXPECT_EQ(noteList.notes[1].waveStart, 3.0f);
+    EXPECT_EQ(starts(), (std::vector<float>{2.0f, 3.0f}));
 }
 
 TEST_F(NoteListLimits, IndicesOutsideTheListsAreRefused) {
     addNote(1.0f, 1.5f);
     ASSERT_EQ(appendBarline(1.0f), 1);
-    EXPECT_EQ(insertNote(2, noteSpanning(2.0f, 2.5f)), 0);
-    EXPECT_EQ(insertNote(-1, noteSpanning(0.0f, 0.5f)), 0);
-    EXPECT_EQ(removeNote(1), 0);
-    EXPECT_EQ(removeNote(-1), 0);
-    EXPECT_EQ(insertBarline(2, 2.0f), 0);
-    EXPECT_EQ(removeBarline(1), 0);
-    EXPECT_EQ(removeBarline(-1), 0);
+    // Every call is refused (a braced list runs them in order).
+    EXPECT_EQ((std::vector<int>{insertNote(2, noteSpanning(2.0f, 2.5f)), insertNote(-1, noteSpanning(0.0f, 0.5f)), removeNote(1),
+                                removeNote(-1), insertBarline(2, 2.0f), removeBarline(1), removeBarline(-1),
+                                validateNoteTimes(1, false), validateNoteTimes(-1, true)}),
+              std::vector<int>(9, 0));
+    validateBarlineTime(1);
+    validateBarlineTime(-1);
     EXPECT_EQ(noteList.count, 1);
     EXPECT_EQ(barlineList.count, 1);
-}
-
-TEST_F(NoteListLimits, ClosingTheSongEmptiesNotesAndBarlines) {
-    addNote(1.0f, 1.5f);
-    ASSERT_EQ(appendBarline(1.0f), 1);
-    resetNoteList();
+    resetNoteList();   // the song closes
     EXPECT_EQ(noteList.count, 0);
     EXPECT_EQ(barlineList.count, 0);
 }
@@ -155,7 +144,7 @@ TEST_F(NoteListTimes, AStartInsideThePreviousNoteMovesToItsEndAndASqueezedNoteGr
     EXPECT_DOUBLE_EQ(note.waveEnd, 2.0 + 2 * D);
 }
 
-TEST_F(NoteListTimes, ThirtySecondsIsTheLongestValidNote) {
+TEST_F(NoteListTimes, ANoteLastsFromOneAndAHalfBlocksToThirtySeconds) {
     makeSongOfBlocks(40 * 128);
     addNote(1.0f, 31.0f);
     EXPECT_EQ(validateNoteTimes(0, false), 1);
@@ -164,21 +153,26 @@ TEST_F(NoteListTimes, ThirtySecondsIsTheLongestValidNote) {
     noteList.notes[0].waveEnd = 31.0f;
     noteList.notes[0].midiEnd = 31.01f;
     EXPECT_EQ(validateNoteTimes(0, false), 0) << "the MIDI span counts as well";
-}
-
-TEST_F(NoteListTimes, OneAndAHalfBlocksIsTheShortestValidNote) {
-    addNote(1.0f, float(1.0 + 1.5 * D));
+    noteList.notes[0] = noteSpanning(1.0f, float(1.0 + 1.5 * D));
     EXPECT_EQ(validateNoteTimes(0, false), 1);
     noteList.notes[0].waveEnd = float(1.0 + 1.25 * D);
     EXPECT_EQ(validateNoteTimes(0, false), 0);
     EXPECT_DOUBLE_EQ(noteList.notes[0].waveEnd, 1.0 + 1.25 * D) << "a short note alone is refused, not lengthened";
 }
 
-TEST_F(NoteListTimes, NegativeTimesBecomeZero) {
+TEST_F(NoteListTimes, NegativeTimesAndTimesThatAreNotNumbersBecomeZero) {
     addNote(-0.5f, 1.0f);
     noteList.notes[0].waveStart = -0.25f;
     EXPECT_EQ(validateNoteTimes(0, false), 1);
     EXPECT_EQ(noteList.notes[0].midiStart, 0.0f);
+    EXPECT_EQ(noteList.notes[0].waveStart, 0.0f);
+    noteList.notes[0] = noteSpanning(1.0f, 2.0f);
+    noteList.notes[0].waveEnd = std::numeric_limits<float>::quiet_NaN();
+    EXPECT_EQ(validateNoteTimes(0, false), 0) << "the wave span now ends at 0, before it starts";
+    EXPECT_EQ(noteList.notes[0].waveEnd, 0.0f);
+    noteList.notes[0].waveStart = std::numeric_limits<float>::quiet_NaN();
+    noteList.notes[0].waveEnd = 1.0f;
+    EXPECT_EQ(validateNoteTimes(0, false), 1);
     EXPECT_EQ(noteList.notes[0].waveStart, 0.0f);
 }
 
@@ -202,76 +196,31 @@ TEST_F(NoteListTimes, ANoteStandingAloneIgnoresItsNeighbours) {
     EXPECT_EQ(noteList.notes[1].waveStart, 0.0f) << "negatives still become 0";
 }
 
-TEST_F(NoteListTimes, TimesThatAreNotNumbersCountAsNegative) {
-    addNote(1.0f, 2.0f);
-    noteList.notes[0].waveEnd = std::numeric_limits<float>::quiet_NaN();
-    EXPECT_EQ(validateNoteTimes(0, false), 0) << "the wave span now ends at 0, before it starts";
-    EXPECT_EQ(noteList.notes[0].waveEnd, 0.0f);
-    noteList.notes[0].waveStart = std::numeric_limits<float>::quiet_NaN();
-    noteList.notes[0].waveEnd = 1.0f;
-    EXPECT_EQ(validateNoteTimes(0, false), 1);
-    EXPECT_EQ(noteList.notes[0].waveStart, 0.0f);
-}
-
-TEST_F(NoteListTimes, AnIndexOutsideTheListIsRefused) {
-    addNote(1.0f, 2.0f);
-    EXPECT_EQ(validateNoteTimes(1, false), 0);
-    EXPECT_EQ(validateNoteTimes(-1, true), 0);
-}
-
 // ---- barline times ----
 
-class NoteListBarlines : public NoteSongTest {
-protected:
-    void addBarline(float time) { ASSERT_EQ(appendBarline(time), 1); }
-};
+using NoteListBarlines = NoteSongTest;
 
-TEST_F(NoteListBarlines, NegativeTimesBecomeZeroAndTimesPastTheEndTheEnd) {
-    addBarline(-0.5f);
-    addBarline(12.0f);
-    validateBarlineTime(0);
-    validateBarlineTime(1);
-    EXPECT_EQ(barlineList.times[0], 0.0f);
-    EXPECT_EQ(barlineList.times[1], 10.0f);
-}
-
-TEST_F(NoteListBarlines, ABarlineKeepsTwoBlocksFromThePreviousOne) {
-    addBarline(1.0f);
-    addBarline(1.01f);
-    validateBarlineTime(1);
-    EXPECT_DOUBLE_EQ(barlineList.times[1], 1.0 + 2 * D);
-}
-
-TEST_F(NoteListBarlines, ABarlineKeepsTwoBlocksFromTheNextOne) {
-    addBarline(1.0f);
-    addBarline(2.0f);
-    barlineList.times[0] = 1.995f;
-    validateBarlineTime(0);
-    EXPECT_DOUBLE_EQ(barlineList.times[0], 2.0 - 2 * D);
-}
-
-TEST_F(NoteListBarlines, AMovedBarlineLandsOnTheNearestBlockBoundary) {
-    // Two blocks after a barline three quarters of a block past 1.0 s is 1.0 + 2.75 D; the
-    // nearest boundary is 1.0 + 3 D.
-    addBarline(float(1.0 + 0.75 * D));
-    addBarline(1.0f);
-    validateBarlineTime(1);
-    EXPECT_DOUBLE_EQ(barlineList.times[1], 1.0 + 3 * D);
-}
-
-TEST_F(NoteListBarlines, ABarlineFarFromItsNeighboursStaysWhereItIs) {
-    addBarline(1.0f);
-    addBarline(float(1.0 + 2 * D));
-    addBarline(3.0f);
-    barlineList.times[1] = float(1.0 + 2.3 * D);
-    validateBarlineTime(1);
-    EXPECT_EQ(barlineList.times[1], float(1.0 + 2.3 * D)) << "not snapped when not moved";
-}
-
-TEST_F(NoteListBarlines, AnIndexOutsideTheListChangesNothing) {
-    addBarline(-1.0f);
-    validateBarlineTime(1);
-    validateBarlineTime(-1);
-    EXPECT_EQ(barlineList.times[0], -1.0f);
-    EXPECT_EQ(barlineList.count, 1);
+// Negative times become 0 and times past the end the end; a barline keeps two blocks from its
+// neighbours, landing on the nearest block boundary when moved; one far from them stays.
+TEST_F(NoteListBarlines, ABarlineStaysInTheSongAndTwoBlocksFromItsNeighbours) {
+    struct Case {
+        std::vector<float> times;
+        int index;
+        double expected;
+    } cases[] = {
+        {{-0.5f}, 0, 0.0},
+        {{12.0f}, 0, 10.0},
+        {{1.0f, 1.01f}, 1, 1.0 + 2 * D},
+        {{1.995f, 2.0f}, 0, 2.0 - 2 * D},
+        {{1.995f, float(2.0 + 0.75 * D)}, 0, 2.0 - D},   // two blocks before the next is 2.0 - 1.25 D
+        // Two blocks after 1.0 + 0.75 D is 1.0 + 2.75 D; the nearest boundary is 1.0 + 3 D.
+        {{float(1.0 + 0.75 * D), 1.0f}, 1, 1.0 + 3 * D},
+        {{1.0f, float(1.0 + 2.3 * D), 3.0f}, 1, float(1.0 + 2.3 * D)},   // not snapped when not moved
+    };
+    for (const Case& c : cases) {
+        resetNoteList();
+        for (float t : c.times) ASSERT_EQ(appendBarline(t), 1);
+        validateBarlineTime(c.index);
+        EXPECT_DOUBLE_EQ(barlineList.times[c.index], c.expected) << c.times[0];
+    }
 }

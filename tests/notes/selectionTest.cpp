@@ -2,6 +2,9 @@
 // notes and notes taken from it, and the edit range a time command works on in each mode.
 #include <gtest/gtest.h>
 
+#include <vector>
+#include <tuple>
+
 #include "notes/noteFixtures.h"
 #include "notes/selection.h"
 
@@ -41,13 +44,9 @@ TEST_F(SelectionMembers, ASelectedNoteIsFoundWithItsPlaceInTheSelection) {
 TEST_F(SelectionMembers, SelectingTwiceKeepsOneEntryAndIndicesOutsideTheListAreRefused) {
     select({2, 2});
     EXPECT_EQ(selection.selectedNoteCount, 1);
-    EXPECT_EQ(selectNote(6), 0);
-    EXPECT_EQ(selectNote(-1), 0);
-    EXPECT_EQ(selectBarline(4), 0);
-    EXPECT_EQ(selectBarline(1), 1);
-    EXPECT_EQ(selectBarline(1), 1);
-    EXPECT_EQ(selection.selectedNoteCount, 1);
-    EXPECT_EQ(selection.selectedBarlineCount, 1);
+    EXPECT_EQ((std::vector<int>{selectNote(6), selectNote(-1), selectBarline(4), selectBarline(1), selectBarline(1)}),
+              (std::vector<int>{0, 0, 0, 1, 1}));
+    EXPECT_EQ(std::tuple(selection.selectedNoteCount, selection.selectedBarlineCount), std::tuple(1, 1));
 }
 
 TEST_F(SelectionMembers, RangesGiveTheSmallestAndLargestIndexOrZerosWhenNothingIsSelected) {
@@ -74,17 +73,7 @@ TEST_F(SelectionMembers, RangesGiveTheSmallestAndLargestIndexOrZerosWhenNothingI
     EXPECT_EQ(highest, 2);
 }
 
-TEST_F(SelectionMembers, NotesThreeFiveAndFourAreContiguous) {
-    select({3, 5, 4});
-    EXPECT_EQ(isContiguousSelection(), 1);
-}
-
-TEST_F(SelectionMembers, NotesThreeAndFiveAloneAreNotContiguous) {
-    select({3, 5});
-    EXPECT_EQ(isContiguousSelection(), 0);
-}
-
-TEST_F(SelectionMembers, OneNoteOrNoneIsNeverContiguous) {
+TEST_F(SelectionMembers, OnlyTwoOrMoreNotesWithoutAGapAreContiguous) {
     EXPECT_EQ(isContiguousSelection(), 0);
     select({4});
     EXPECT_EQ(isContiguousSelection(), 0);
@@ -92,6 +81,11 @@ TEST_F(SelectionMembers, OneNoteOrNoneIsNeverContiguous) {
     selection.selectedNotes[1] = 4;
     selection.selectedNoteCount = 2;
     EXPECT_EQ(isContiguousSelection(), 0);
+    resetSelection();
+    select({3, 5});
+    EXPECT_EQ(isContiguousSelection(), 0);
+    select({4});
+    EXPECT_EQ(isContiguousSelection(), 1);
 }
 
 TEST_F(SelectionMembers, ClosingTheSongClearsEverySelection) {
@@ -101,81 +95,62 @@ TEST_F(SelectionMembers, ClosingTheSongClearsEverySelection) {
     selection.pointerNote = 1;
     selection.pointerBarline = 0;
     resetSelection();
-    EXPECT_EQ(selection.selectedNoteCount, 0);
-    EXPECT_EQ(selection.selectedBarlineCount, 0);
-    EXPECT_EQ(selection.timeSelectionStart, -1.0f);
-    EXPECT_EQ(selection.timeSelectionEnd, -1.0f);
-    EXPECT_EQ(selection.pointerNote, -1);
-    EXPECT_EQ(selection.pointerBarline, -1);
+    const Selection& s = selection;
+    EXPECT_EQ(std::tuple(s.selectedNoteCount, s.selectedBarlineCount, s.timeSelectionStart, s.timeSelectionEnd, s.pointerNote,
+                         s.pointerBarline),
+              std::tuple(0, 0, -1.0f, -1.0f, -1, -1));
 }
 
 // ---- the time selection and the notes ----
 
 class SelectionTime : public SelectionTest {};
 
-TEST_F(SelectionTime, WithoutATimeSelectionItBecomesExactlyTheSelectedNotesSpan) {
-    select({3, 1, 2});
-    extendTimeSelectionToNotes(false);
-    EXPECT_EQ(selection.timeSelectionStart, 2.0f);
-    EXPECT_EQ(selection.timeSelectionEnd, 4.5f);
+// Without a time selection (or with half of one) it becomes the selected notes' span; an
+// existing one is only widened; a reset makes it cover exactly the selected notes, or nothing.
+TEST_F(SelectionTime, TheTimeSelectionIsExtendedToTheSelectedNotes) {
+    struct Case {
+        std::vector<int> notes;
+        double start, end;
+        bool reset;
+        float expectedStart, expectedEnd;
+    } cases[] = {
+        {{3, 1, 2}, -1.0, -1.0, false, 2.0f, 4.5f},
+        {{4}, 1.0, -1.0, false, 5.0f, 5.5f},
+        {{2}, 3.25, 5.0, false, 3.0f, 5.0f},   // already past the note's end
+        {{2}, 0.5, 5.0, true, 3.0f, 3.5f},
+        {{}, 0.5, 5.0, true, -1.0f, -1.0f},
+    };
+    for (const Case& c : cases) {
+        resetSelection();
+        for (int i : c.notes) ASSERT_EQ(selectNote(i), 1);
+        setTimeSelection(c.start, c.end);
+        extendTimeSelectionToNotes(c.reset);
+        EXPECT_EQ(selection.timeSelectionStart, c.expectedStart) << c.start;
+        EXPECT_EQ(selection.timeSelectionEnd, c.expectedEnd) << c.start;
+    }
 }
 
-TEST_F(SelectionTime, AnExistingTimeSelectionIsOnlyWidened) {
-    select({2});
-    setTimeSelection(3.25, 5.0);
-    extendTimeSelectionToNotes(false);
-    EXPECT_EQ(selection.timeSelectionStart, 3.0f);
-    EXPECT_EQ(selection.timeSelectionEnd, 5.0f) << "already past the note's end";
-}
-
-TEST_F(SelectionTime, ResetMakesItCoverExactlyTheSelectedNotesOrNothing) {
-    select({2});
-    setTimeSelection(0.5, 5.0);
-    extendTimeSelectionToNotes(true);
-    EXPECT_EQ(selection.timeSelectionStart, 3.0f);
-    EXPECT_EQ(selection.timeSelectionEnd, 3.5f);
-
-    selection.selectedNoteCount = 0;
-    extendTimeSelectionToNotes(true);
-    EXPECT_EQ(selection.timeSelectionStart, -1.0f);
-    EXPECT_EQ(selection.timeSelectionEnd, -1.0f);
-}
-
-TEST_F(SelectionTime, AHalfTimeSelectionCountsAsNoneAndIsReplaced) {
-    select({4});
-    setTimeSelection(1.0, -1.0);
-    extendTimeSelectionToNotes(false);
-    EXPECT_EQ(selection.timeSelectionStart, 5.0f);
-    EXPECT_EQ(selection.timeSelectionEnd, 5.5f);
-}
-
+// Notes 1 (2.0 .. 2.5) and 2 (3.0 .. 3.5) are taken, in index order, with exactly half a block
+// to spare at both ends; a note cut by more is left out; without a time selection none is.
 TEST_F(SelectionTime, NotesWithinHalfABlockOfTheTimeSelectionAreTakenInIndexOrder) {
-    select({5});
-    // Notes 1 (2.0 .. 2.5) and 2 (3.0 .. 3.5), with exactly half a block to spare at both ends.
-    setTimeSelection(2.0 + D / 2, 3.5 - D / 2);
-    selectNotesInTimeSelection();
-    ASSERT_EQ(selection.selectedNoteCount, 2);
-    EXPECT_EQ(selection.selectedNotes[0], 1);
-    EXPECT_EQ(selection.selectedNotes[1], 2);
-}
-
-TEST_F(SelectionTime, ANoteCutByMoreThanHalfABlockIsLeftOut) {
-    setTimeSelection(2.0 + D / 2 + D / 8, 3.5 - D / 2);
-    selectNotesInTimeSelection();
-    ASSERT_EQ(selection.selectedNoteCount, 1);
-    EXPECT_EQ(selection.selectedNotes[0], 2);
-
-    setTimeSelection(2.0, 3.5 - D / 2 - D / 8);
-    selectNotesInTimeSelection();
-    ASSERT_EQ(selection.selectedNoteCount, 1);
-    EXPECT_EQ(selection.selectedNotes[0], 1);
-}
-
-TEST_F(SelectionTime, WithoutATimeSelectionNoNoteIsTaken) {
-    select({1, 2});
-    setTimeSelection(-1.0, 4.0);
-    selectNotesInTimeSelection();
-    EXPECT_EQ(selection.selectedNoteCount, 0);
+    struct Case {
+        double start, end;
+        std::vector<int> taken;
+    } cases[] = {
+        {2.0 + D / 2, 3.5 - D / 2, {1, 2}},
+        {2.0 + D / 2 + D / 8, 3.5 - D / 2, {2}},
+        {2.0, 3.5 - D / 2 - D / 8, {1}},
+        {-1.0, 4.0, {}},
+    };
+    for (const Case& c : cases) {
+        resetSelection();
+        select({5, 1});
+        setTimeSelection(c.start, c.end);
+        selectNotesInTimeSelection();
+        EXPECT_EQ(std::vector<int>(selection.selectedNotes, selection.selectedNotes + selection.selectedNoteCount),
+                  c.taken)
+            << c.start << " .. " << c.end;
+    }
 }
 
 TEST_F(SelectionTime, InMidiModeANoteReachingHalfABlockIntoTheSelectionOccupiesIt) {
@@ -203,60 +178,38 @@ TEST_F(SelectionTime, InWaveModeOrWhilePlacingNotesTheSelectionIsAlwaysFree) {
 
 // ---- the edit range ----
 
-class SelectionEditRange : public SelectionTest {
-protected:
-    double start = 99.0, end = 99.0;
-};
-
-TEST_F(SelectionEditRange, WaveModeUsesTheTimeSelectionEvenWithNotesSelected) {
-    select({4});
-    setTimeSelection(1.25, 2.75);
-    EXPECT_EQ(getEditRange(start, end), EDIT_RANGE_TIME);
-    EXPECT_EQ(start, 1.25);
-    EXPECT_EQ(end, 2.75);
-}
-
-TEST_F(SelectionEditRange, HalfABlockOrLessGivesNoCodeButKeepsThePoint) {
-    setTimeSelection(2.75, 2.75 + D / 2);
-    EXPECT_EQ(getEditRange(start, end), EDIT_RANGE_NONE);
-    EXPECT_EQ(start, 2.75);
-    EXPECT_EQ(end, 2.75 + D / 2);
-    setTimeSelection(2.75, 2.75 + D / 2 + D / 8);
-    EXPECT_EQ(getEditRange(start, end), EDIT_RANGE_TIME);
-}
-
-TEST_F(SelectionEditRange, NoSelectionGivesNoRange) {
-    EXPECT_EQ(getEditRange(start, end), EDIT_RANGE_NONE);
-    EXPECT_EQ(start, -1.0);
-    EXPECT_EQ(end, -1.0);
-}
-
-TEST_F(SelectionEditRange, MidiModeWithNotesSelectedRunsFromTheLowestToTheHighestNote) {
-    displayModes.playbackMode = PLAYBACK_MODE_MIDI;
-    select({4, 1, 2});
-    setTimeSelection(0.25, 0.5);
-    EXPECT_EQ(getEditRange(start, end), EDIT_RANGE_NOTES);
-    EXPECT_EQ(start, 2.0);
-    EXPECT_EQ(end, 5.5);
-}
-
-TEST_F(SelectionEditRange, MidiModeWithOnlyBarlinesSelectedGivesTheNotesCodeWithoutARange) {
-    displayModes.playbackMode = PLAYBACK_MODE_MIDI;
-    ASSERT_EQ(selectBarline(1), 1);
-    ASSERT_EQ(selectBarline(2), 1);
-    EXPECT_EQ(getEditRange(start, end), EDIT_RANGE_NOTES);
-    EXPECT_EQ(start, -1.0);
-    EXPECT_EQ(end, -1.0) << "no stretch from before the song's start to a barline";
-}
-
-TEST_F(SelectionEditRange, MidiModeDropsATimeSelectionThatHoldsANote) {
-    displayModes.playbackMode = PLAYBACK_MODE_MIDI;
-    setTimeSelection(1.75, 3.25);
-    EXPECT_EQ(getEditRange(start, end), EDIT_RANGE_NONE);
-    EXPECT_EQ(start, -1.0);
-    EXPECT_EQ(end, -1.0);
-    setTimeSelection(1.5, 2.0);
-    EXPECT_EQ(getEditRange(start, end), EDIT_RANGE_TIME) << "the gap between two notes is free";
-    EXPECT_EQ(start, 1.5);
-    EXPECT_EQ(end, 2.0);
+// Wave mode uses the time selection even with notes selected, when longer than half a block
+// (which gives no code but keeps the point); MIDI mode runs from the lowest to the highest
+// selected note, gives the notes code without a range for barlines alone (no stretch from
+// before the song's start to a barline), and drops a time selection that holds a note.
+TEST_F(SelectionTest, TheEditRangeFollowsTheModeAndTheSelections) {
+    struct Case {
+        int mode;
+        std::vector<int> notes, barlines;
+        double start, end;
+        int code;
+        double rangeStart, rangeEnd;
+    } cases[] = {
+        {PLAYBACK_MODE_WAVE, {4}, {}, 1.25, 2.75, EDIT_RANGE_TIME, 1.25, 2.75},
+        {PLAYBACK_MODE_WAVE, {}, {}, 2.75, 2.75 + D / 2, EDIT_RANGE_NONE, 2.75, 2.75 + D / 2},
+        {PLAYBACK_MODE_WAVE, {}, {}, 2.75, 2.75 + D / 2 + D / 8, EDIT_RANGE_TIME, 2.75, 2.75 + D / 2 + D / 8},
+        {PLAYBACK_MODE_WAVE, {}, {}, -1.0, -1.0, EDIT_RANGE_NONE, -1.0, -1.0},
+        {PLAYBACK_MODE_MIDI, {4, 1, 2}, {}, 0.25, 0.5, EDIT_RANGE_NOTES, 2.0, 5.5},
+        {PLAYBACK_MODE_MIDI, {}, {1, 2}, -1.0, -1.0, EDIT_RANGE_NOTES, -1.0, -1.0},
+        {PLAYBACK_MODE_MIDI, {}, {}, 1.75, 3.25, EDIT_RANGE_NONE, -1.0, -1.0},
+        {PLAYBACK_MODE_MIDI, {}, {}, 1.5, 2.0, EDIT_RANGE_TIME, 1.5, 2.0},   // the gap between two notes is free
+    };
+    int row = 0;
+    for (const Case& c : cases) {
+        resetSelection();
+        displayModes.playbackMode = c.mode;
+        for (int i : c.notes) ASSERT_EQ(selectNote(i), 1);
+        for (int i : c.barlines) ASSERT_EQ(selectBarline(i), 1);
+        setTimeSelection(c.start, c.end);
+        double start = 99.0, end = 99.0;
+        EXPECT_EQ(getEditRange(start, end), c.code) << "row " << row;
+        EXPECT_EQ(float(start), float(c.rangeStart)) << "row " << row;   // the time selection is held in floats
+        EXPECT_EQ(float(end), float(c.rangeEnd)) << "row " << row;
+        row++;
+    }
 }

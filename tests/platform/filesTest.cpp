@@ -1,9 +1,14 @@
-// The single-instance lock, free space and the failure injection of the file wrappers.
+// The single-instance lock, free space, and the failure injection of the file wrappers and
+// of allocations.
 #include <gtest/gtest.h>
 
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <cerrno>
+#include <vector>
+
+#include "platform/allocation.h"
 #include "platform/files.h"
 #include "support/testSupport.h"
 
@@ -88,4 +93,19 @@ TEST(Folders, MakeFolderCreatesMissingParents) {
     EXPECT_EQ(makeFolder(folder.file("a/b/c")), 0) << "an existing folder is success";
     writeFileText(folder.file("plain"), "x");
     EXPECT_NE(makeFolder(folder.file("plain/sub")), 0);
+}
+
+TEST(AllocationFailureInjection, FailsExactlyTheNthAllocationAndLeavesTheVectorAsItWas) {
+    std::vector<int> v{1, 2};
+    failAllocation(2);
+    EXPECT_TRUE(tryResize(v, 3));
+    errno = 0;
+    EXPECT_FALSE(tryResize(v, 10, 7));
+    EXPECT_EQ(errno, ENOMEM);
+    EXPECT_EQ(v, (std::vector<int>{1, 2, 0}));
+    EXPECT_TRUE(allocationAllowed());
+    // Beyond what a vector can hold is a failure too, not an exception.
+    EXPECT_FALSE(tryResize(v, v.max_size() + 1));
+    EXPECT_FALSE(tryAllocate([] { throw std::bad_alloc(); }));
+    EXPECT_EQ(v.size(), 3u);
 }

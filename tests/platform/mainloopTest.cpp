@@ -27,14 +27,9 @@ TEST_F(MainLoop, QuitEndsTheLoopEvenWithCallsWaitingBehindIt) {
     EXPECT_EQ(runMainLoop(&quit), 7);
     EXPECT_EQ(quit, 1u);
     EXPECT_EQ(served, std::vector<int>{1});
-}
-
-TEST_F(MainLoop, ALoopWithTheQuitFlagAlreadySetNeverRuns) {
-    bool ran = false;
-    postToMainLoop([&] { ran = true; });
-    volatile uint32_t quit = 1;
+    // A loop with the quit flag already set never runs.
     EXPECT_EQ(runMainLoop(&quit), 0);
-    EXPECT_FALSE(ran);
+    EXPECT_EQ(served, std::vector<int>{1});
 }
 
 static std::atomic<int> captureEvents{0};

@@ -8,6 +8,7 @@
 #include <cstring>
 #include <filesystem>
 #include <thread>
+#include <tuple>
 
 #include "platform/registry.h"
 #include "platform/ui.h"
@@ -15,22 +16,8 @@
 
 namespace fs = std::filesystem;
 
-class RegistryTest : public ::testing::Test {
+class RegistryTest : public ConfigFolderTest {
 protected:
-    void SetUp() override {
-        const char* old = std::getenv("MELODRIFT_CONFIG_DIR");
-        savedConfig = old ? old : "";
-        config = folder.file("config/");
-        setenv("MELODRIFT_CONFIG_DIR", config.c_str(), 1);
-        resetRegistry();
-        clearUiCalls();
-    }
-    void TearDown() override {
-        setenv("MELODRIFT_CONFIG_DIR", savedConfig.c_str(), 1);
-        resetRegistry();
-        clearUiCalls();
-    }
-    std::string machineFile() const { return config + "machine.reg"; }
     RegistryKey create(int root, const std::string& path) {
         RegistryKey key = 0;
         bool existed = true;
@@ -48,10 +35,6 @@ protected:
         std::sort(names.begin(), names.end());
         return names;
     }
-
-    TempFolder folder;
-    std::string config;
-    std::string savedConfig;
 };
 
 const char* const HEADER = "Melodrift Settings Version 1\n"
@@ -79,14 +62,14 @@ TEST_F(RegistryFile, HoldsEveryKeyAndValueInTheDocumentedText) {
                                                "\"Blob\"=hex:2c,00,ff\n"
                                                "\"Nothing\"=hex:\n"
                                                "\n[SOFTWARE\\Empty]\n");
-    EXPECT_FALSE(fs::exists(config + "user.reg"));
-}
+    EXPECT_FALSE(fs::exists(userFile()));
 
-TEST_F(RegistryFile, TheUsersRootIsItsOwnFile) {
-    RegistryKey key = create(REG_ROOT_USER, "SOFTWARE\\Mine");
+    // The user's root is its own file.
+    std::string machine = readFileText(machineFile());
+    key = create(REG_ROOT_USER, "SOFTWARE\\Mine");
     ASSERT_EQ(regSetDword(key, "One", 1), REG_OK);
-    EXPECT_FALSE(fs::exists(machineFile()));
-    EXPECT_NE(readFileText(config + "user.reg").find("\"One\"=dword:00000001"), std::string::npos);
+    EXPECT_EQ(readFileText(machineFile()), machine);
+    EXPECT_NE(readFileText(userFile()).find("\"One\"=dword:00000001"), std::string::npos);
     RegistryKey machineKey = 0;
     EXPECT_EQ(regOpenKey(REG_ROOT_MACHINE, "SOFTWARE\\Mine", REG_ACCESS_READ, &machineKey), REG_NOT_FOUND);
     EXPECT_EQ(machineKey, 0);
@@ -101,10 +84,9 @@ TEST_F(RegistryFile, EveryChangeReplacesTheFileAndLeavesNoTemporaryFile) {
     EXPECT_EQ(readFileText(folder.file("old.reg")), before);
     EXPECT_NE(readFileText(machineFile()).find("\"Value 19\"=dword:00000013"), std::string::npos);
     EXPECT_EQ(configEntries(), std::vector<std::string>{"machine.reg"});
-}
 
-TEST_F(RegistryFile, SettingAnUnchangedValueDoesNotRewriteTheFile) {
-    RegistryKey key = create(REG_ROOT_MACHINE, "SOFTWARE\\Torvellan");
+    // Setting an unchanged value does not rewrite the file.
+    fs::remove(folder.file("old.reg"));
     ASSERT_EQ(regSetString(key, "Name", "same"), REG_OK);
     fs::create_hard_link(machineFile(), folder.file("old.reg"));
     ASSERT_EQ(regSetString(key, "Name", "same"), REG_OK);
@@ -168,12 +150,10 @@ TEST_F(RegistryValues, BinaryAndDwordValuesRoundTrip) {
     EXPECT_EQ(value, 0xffffffffu);
     ASSERT_EQ(regQueryDword(again, "Zero", &value), REG_OK);
     EXPECT_EQ(value, 0u);
-}
 
-TEST_F(RegistryValues, AKeyWithoutValuesStillExistsAfterReloading) {
+    // A key without values still exists after reloading.
     create(REG_ROOT_MACHINE, "SOFTWARE\\Torvellan\\Melodrift\\1.0\\DataPath");
     resetRegistry();
-    RegistryKey key = 0;
     bool existed = false;
     ASSERT_EQ(regCreateKey(REG_ROOT_MACHINE, "SOFTWARE\\Torvellan\\Melodrift\\1.0\\DataPath", REG_ACCESS_WRITE, &key,
                            &existed),
@@ -205,6 +185,9 @@ TEST_F(RegistryValues, MissingWrongTypeReadOnlyAndStaleKeysAreRefused) {
     EXPECT_EQ(regQueryBinary(key, "Text", &bytes), REG_WRONG_TYPE);
     EXPECT_EQ(regQueryString(key, "Absent", &text), REG_NOT_FOUND);
     EXPECT_EQ(regDeleteValue(key, "Absent"), REG_NOT_FOUND);
+    ASSERT_EQ(regSetDword(key, "Drop", 2), REG_OK);
+    ASSERT_EQ(regDeleteValue(key, "drop"), REG_OK);
+    EXPECT_EQ(readFileText(machineFile()).find("Drop"), std::string::npos) << "a deleted value is gone from the file";
 
     std::string before = readFileText(machineFile());
     RegistryKey readOnly = openRead("SOFTWARE\\Torvellan");
@@ -217,17 +200,6 @@ TEST_F(RegistryValues, MissingWrongTypeReadOnlyAndStaleKeysAreRefused) {
     resetRegistry();
     EXPECT_EQ(regSetString(key, "Text", "False"), REG_INVALID_HANDLE);
     EXPECT_EQ(readFileText(machineFile()), before);
-}
-
-TEST_F(RegistryValues, ADeletedValueIsGoneFromTheFile) {
-    RegistryKey key = create(REG_ROOT_MACHINE, "SOFTWARE\\Torvellan");
-    ASSERT_EQ(regSetDword(key, "Keep", 1), REG_OK);
-    ASSERT_EQ(regSetDword(key, "Drop", 2), REG_OK);
-    ASSERT_EQ(regDeleteValue(key, "drop"), REG_OK);
-    resetRegistry();
-    uint32_t value = 0;
-    EXPECT_EQ(regQueryDword(openRead("SOFTWARE\\Torvellan"), "Drop", &value), REG_NOT_FOUND);
-    EXPECT_EQ(readFileText(machineFile()).find("Drop"), std::string::npos);
 }
 
 TEST_F(RegistryValues, ConcurrentWritersLoseNothing) {
@@ -326,17 +298,6 @@ TEST_F(RegistryDamage, AnEarlierDamagedCopyIsNeverOverwritten) {
     EXPECT_NE(lastMessageText().find("kept as " + machineFile() + ".damaged.2 "), std::string::npos);
 }
 
-TEST_F(RegistryDamage, AFileOfExactlyOneMebibyteIsAccepted) {
-    fs::create_directories(config);
-    std::string text = "Melodrift Settings Version 1\n[SOFTWARE\\Big]\n;";
-    text += std::string(1024 * 1024 - text.size() - 1, 'x') + "\n";
-    ASSERT_EQ(text.size(), 1024u * 1024u);
-    writeFileText(machineFile(), text);
-    RegistryKey key = 0;
-    EXPECT_EQ(regOpenKey(REG_ROOT_MACHINE, "SOFTWARE\\Big", REG_ACCESS_READ, &key), REG_OK);
-    EXPECT_EQ(messageCount(), 0);
-}
-
 TEST_F(RegistryDamage, HandWrittenFilesWithAByteOrderMarkCommentsAndWindowsLineEndsAreRead) {
     fs::create_directories(config);
     writeFileText(machineFile(), "\xEF\xBB\xBF\r\nMelodrift Settings Version 1\r\n; note\r\n\r\n  [SOFTWARE\\Torvellan]  \r\n"
@@ -345,12 +306,17 @@ TEST_F(RegistryDamage, HandWrittenFilesWithAByteOrderMarkCommentsAndWindowsLineE
     uint32_t a = 0;
     std::string b;
     std::vector<uint8_t> c;
-    EXPECT_EQ(regQueryDword(key, "A", &a), REG_OK);
-    EXPECT_EQ(a, 0x20u);   // a repeated value: the later line wins
-    EXPECT_EQ(regQueryString(key, "B", &b), REG_OK);
-    EXPECT_EQ(b, "x y");
-    EXPECT_EQ(regQueryBinary(key, "C", &c), REG_OK);
-    EXPECT_EQ(c, (std::vector<uint8_t>{0xab, 0xcd}));
+    // A repeated value: the later line wins.
+    EXPECT_EQ((std::vector<int>{regQueryDword(key, "A", &a), regQueryString(key, "B", &b), regQueryBinary(key, "C", &c)}),
+              std::vector<int>(3, REG_OK));
+    EXPECT_EQ(std::tuple(a, b, c), std::tuple(0x20u, "x y", std::vector<uint8_t>{0xab, 0xcd}));
+    // A file of exactly one mebibyte is accepted.
+    std::string text = "Melodrift Settings Version 1\n[SOFTWARE\\Big]\n;";
+    text += std::string(1024 * 1024 - text.size() - 1, 'x') + "\n";
+    ASSERT_EQ(text.size(), 1024u * 1024u);
+    writeFileText(machineFile(), text);
+    resetRegistry();
+    EXPECT_EQ(regOpenKey(REG_ROOT_MACHINE, "SOFTWARE\\Big", REG_ACCESS_READ, &key), REG_OK);
     EXPECT_EQ(messageCount(), 0);
 }
 
@@ -369,12 +335,11 @@ TEST_F(RegistryFailures, AConfigFolderThatIsAFileRefusesWritesButReadsAsEmpty) {
     EXPECT_EQ(regOpenKey(REG_ROOT_MACHINE, "SOFTWARE\\Torvellan", REG_ACCESS_READ, &key), REG_NOT_FOUND);
     EXPECT_EQ(readFileText(folder.file("config")), "not a folder");
     EXPECT_EQ(messageCount(), 0);
-}
 
-TEST_F(RegistryFailures, ARootFileThatCannotBeReadIsNeitherReplacedNorSetAside) {
+    // A root file that cannot be read is neither replaced nor set aside.
+    fs::remove(folder.file("config"));
     fs::create_directories(machineFile());   // a folder where the file should be
-    RegistryKey key = 0;
-    bool existed = false;
+    resetRegistry();
     EXPECT_EQ(regOpenKey(REG_ROOT_MACHINE, "SOFTWARE", REG_ACCESS_READ, &key), REG_IO_ERROR);
     EXPECT_EQ(regCreateKey(REG_ROOT_MACHINE, "SOFTWARE\\Torvellan", REG_ACCESS_WRITE, &key, &existed), REG_IO_ERROR);
     EXPECT_TRUE(fs::is_directory(machineFile()));

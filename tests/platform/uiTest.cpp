@@ -1,6 +1,8 @@
 // The headless user interface: what tests and the command-line tool rely on.
 #include <gtest/gtest.h>
 
+#include <tuple>
+
 #include "platform/ui.h"
 
 class HeadlessUi : public ::testing::Test {
@@ -20,12 +22,10 @@ TEST_F(HeadlessUi, MessagesCarryTheProgramTitleAndTheirKind) {
 
 TEST_F(HeadlessUi, QuestionsAreAnsweredFromThePresetThenYes) {
     presetAnswers({ANSWER_NO, ANSWER_YES});
-    EXPECT_EQ(askYesNo("first?"), 0);
-    EXPECT_EQ(askYesNo("second?"), 1);
-    EXPECT_EQ(messageBox("wioFileOpen", "third?", MESSAGE_WARNING, BUTTONS_YES_NO), ANSWER_YES);
-    EXPECT_EQ(messageCount(), 3);
-    EXPECT_EQ(uiCalls()[2].title, "wioFileOpen");
-    EXPECT_EQ(uiCalls()[0].value, ANSWER_NO);
+    EXPECT_EQ((std::vector<int>{askYesNo("first?"), askYesNo("second?"),
+                                messageBox("wioFileOpen", "third?", MESSAGE_WARNING, BUTTONS_YES_NO)}),
+              (std::vector<int>{0, 1, ANSWER_YES}));
+    EXPECT_EQ(std::tuple(messageCount(), uiCalls()[2].title, uiCalls()[0].value), std::tuple(3, "wioFileOpen", ANSWER_NO));
 }
 
 TEST_F(HeadlessUi, StatusCursorProgressAndBeepAreRecordedInOrder) {

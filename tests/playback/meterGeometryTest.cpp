@@ -3,6 +3,8 @@
 // and the window's size going to the settings and back.
 #include <gtest/gtest.h>
 
+#include <tuple>
+
 #include "playback/meterGeometry.h"
 #include "shell/settings.h"
 
@@ -11,13 +13,6 @@ static void expectColour(int level, int red, int green, int blue) {
     EXPECT_EQ(c.red, red) << level;
     EXPECT_EQ(c.green, green) << level;
     EXPECT_EQ(c.blue, blue) << level;
-}
-
-TEST(MeterGeometryColours, TheThresholdsAreEighthsOfFullScale) {
-    EXPECT_EQ(METER_LEVEL_A, 63);
-    EXPECT_EQ(METER_LEVEL_B, 95);
-    EXPECT_EQ(METER_LEVEL_C, 191);
-    EXPECT_EQ(METER_LEVEL_D, 223);
 }
 
 TEST(MeterGeometryColours, GoodLevelsArePureGreenAndTheEdgesShadeThroughYellowToRed) {
@@ -35,20 +30,11 @@ TEST(MeterGeometryColours, GoodLevelsArePureGreenAndTheEdgesShadeThroughYellowTo
 TEST(MeterGeometryBars, BarsFillTheAreaInsideTheMargins) {
     MeterBar bar;
     ASSERT_EQ(meterBar(0, 255, 416, 271, &bar), 1);
-    EXPECT_EQ(bar.left, 8);
-    EXPECT_EQ(bar.width, 12);
-    EXPECT_EQ(bar.top, 8);
-    EXPECT_EQ(bar.height, 255);
+    EXPECT_EQ(std::tuple(bar.left, bar.width, bar.top, bar.height), std::tuple(8, 12, 8, 255));
     ASSERT_EQ(meterBar(31, 1, 416, 271, &bar), 1);
-    EXPECT_EQ(bar.left, 395);
-    EXPECT_EQ(bar.left + bar.width, 408);
-    EXPECT_EQ(bar.top + bar.height, 263);
-    EXPECT_EQ(bar.height, 1);
-}
-
-TEST(MeterGeometryBars, ALevelOfZeroDrawsNoBar) {
-    MeterBar bar{-1, -1, -1, -1};
-    EXPECT_EQ(meterBar(5, 0, 416, 271, &bar), 0);
+    EXPECT_EQ(std::tuple(bar.left, bar.left + bar.width, bar.top + bar.height, bar.height), std::tuple(395, 408, 263, 1));
+    bar = MeterBar{-1, -1, -1, -1};
+    EXPECT_EQ(meterBar(5, 0, 416, 271, &bar), 0) << "a level of zero draws no bar";
     EXPECT_EQ(bar.left, -1);
 }
 
@@ -71,10 +57,7 @@ TEST(MeterGeometryHint, FourSecondsOfLowLevelWhileRecordingShowTheHint) {
     EXPECT_EQ(meterHintShown(true, 1400), 0);
     EXPECT_EQ(meterHintShown(true, 1401), 1);
     EXPECT_EQ(meterHintShown(false, 5000), 0);
-}
-
-TEST(MeterGeometryHint, OneGoodBarRemovesTheHintAtTheNextRepaint) {
-    resetMeterState(1000);
+    // One good bar removes the hint at the next repaint.
     EXPECT_EQ(meterHintShown(true, 2000), 1);
     int levels[METER_BAR_COUNT] = {};
     levels[10] = 95;
@@ -94,10 +77,7 @@ TEST(MeterGeometryHint, TheHintScalesWithTheWindow) {
 TEST(MeterGeometryWindow, TheDefaultsPlaceTheMeterNearTheOwnersBottomLeft) {
     globalSettings = GlobalSettings{};
     MeterRect r = meterWindowRect({0, 0, 1000, 800}, 20);
-    EXPECT_EQ(r.width, 406);
-    EXPECT_EQ(r.height, 282);
-    EXPECT_EQ(r.x, 200);
-    EXPECT_EQ(r.y, 800 - 78 - 282);
+    EXPECT_EQ(std::tuple(r.width, r.height, r.x, r.y), std::tuple(406, 282, 200, 800 - 78 - 282));
 }
 
 TEST(MeterGeometryWindow, AResizedMeterComesBackAtTheSameOuterSize) {

@@ -4,6 +4,7 @@
 
 #include <cstdint>
 #include <string>
+#include <tuple>
 #include <vector>
 
 #include "platform/files.h"
@@ -20,24 +21,16 @@ static Bytes encoded(uint32_t value) {
     return Bytes(out, out + count);
 }
 
+// Values beyond four bytes are written as the largest that fits.
 TEST(MidiFileVariableLength, KnownValuesEncodeAsTheFileFormatGivesThem) {
-    EXPECT_EQ(encoded(0), (Bytes{0x00}));
-    EXPECT_EQ(encoded(0x40), (Bytes{0x40}));
-    EXPECT_EQ(encoded(0x7F), (Bytes{0x7F}));
-    EXPECT_EQ(encoded(0x80), (Bytes{0x81, 0x00}));
-    EXPECT_EQ(encoded(512), (Bytes{0x84, 0x00}));
-    EXPECT_EQ(encoded(0x2000), (Bytes{0xC0, 0x00}));
-    EXPECT_EQ(encoded(0x3FFF), (Bytes{0xFF, 0x7F}));
-    EXPECT_EQ(encoded(0x4000), (Bytes{0x81, 0x80, 0x00}));
-    EXPECT_EQ(encoded(0x1FFFFF), (Bytes{0xFF, 0xFF, 0x7F}));
-    EXPECT_EQ(encoded(0x200000), (Bytes{0x81, 0x80, 0x80, 0x00}));
-    EXPECT_EQ(encoded(0x08000000), (Bytes{0xC0, 0x80, 0x80, 0x00}));
-    EXPECT_EQ(encoded(0x0FFFFFFF), (Bytes{0xFF, 0xFF, 0xFF, 0x7F}));
-}
-
-TEST(MidiFileVariableLength, ValuesBeyondFourBytesAreWrittenAsTheLargestThatFits) {
-    EXPECT_EQ(encoded(0x10000000), (Bytes{0xFF, 0xFF, 0xFF, 0x7F}));
-    EXPECT_EQ(encoded(0xFFFFFFFF), (Bytes{0xFF, 0xFF, 0xFF, 0x7F}));
+    const std::pair<uint32_t, Bytes> cases[] = {
+        {0, {0x00}},           {0x40, {0x40}},                   {0x7F, {0x7F}},
+        {0x80, {0x81, 0x00}},  {512, {0x84, 0x00}},              {0x2000, {0xC0, 0x00}},
+        {0x3FFF, {0xFF, 0x7F}}, {0x4000, {0x81, 0x80, 0x00}},    {0x1FFFFF, {0xFF, 0xFF, 0x7F}},
+        {0x200000, {0x81, 0x80, 0x80, 0x00}},                    {0x08000000, {0xC0, 0x80, 0x80, 0x00}},
+        {0x0FFFFFFF, {0xFF, 0xFF, 0xFF, 0x7F}},                  {0x10000000, {0xFF, 0xFF, 0xFF, 0x7F}},
+        {0xFFFFFFFF, {0xFF, 0xFF, 0xFF, 0x7F}}};
+    for (const auto& [value, bytes] : cases) EXPECT_EQ(encoded(value), bytes) << value;
 }
 
 class MidiFileTest : public ::testing::Test {
@@ -64,25 +57,59 @@ protected:
 
 using MidiFileChunks = MidiFileTest;
 
-TEST_F(MidiFileChunks, AOneTrackFileHasExactlyTheseBytes) {
-    MidiFileWriter w;
-    ASSERT_EQ(createMidiFile(w, path), 1);
-    writeMidiHeader(w, 1, 1, 256);
-    beginMidiTrack(w);
-    writeMidiTempo(w, 0, 500000);
-    writeMidiNoteOn(w, 0, 0, 60, 100);
-    writeMidiPitchBend(w, 0, 0, 8192);
-    writeMidiNoteOff(w, 512, 0, 60);
-    endMidiTrack(w, 1);
-    ASSERT_EQ(finishMidiFile(w), 1);
-
-    Bytes expected = header(1);
-    append(expected, track({0x00, 0xFF, 0x51, 0x03, 0x07, 0xA1, 0x20,   // tempo 500000
-                            0x00, 0x90, 0x3C, 0x64,                     // note on, key 60, velocity 100
-                            0x00, 0xE0, 0x00, 0x40,                     // no bend
-                            0x84, 0x00, 0x80, 0x3C, 0x00,               // 512 ticks later, note off
-                            0x01, 0xFF, 0x2F, 0x00}));                  // end of track a tick later
-    EXPECT_EQ(readFileBytes(path), expected);
+// Each case writes one track's events; the file must hold exactly the header and that track,
+// whose deltas start at zero and end a tick (or none) after its last event.
+TEST_F(MidiFileChunks, OneTrackFilesHaveExactlyTheseBytes) {
+    using Events = void (*)(MidiFileWriter&);
+    struct Case {
+        Events events;
+        uint32_t endDelta;
+        Bytes body;
+    } cases[] = {
+        {[](MidiFileWriter& w) {
+             writeMidiTempo(w, 0, 500000);
+             writeMidiNoteOn(w, 0, 0, 60, 100);
+             writeMidiPitchBend(w, 0, 0, 8192);
+             writeMidiNoteOff(w, 512, 0, 60);
+         },
+         1,
+         {0x00, 0xFF, 0x51, 0x03, 0x07, 0xA1, 0x20,   // tempo 500000
+          0x00, 0x90, 0x3C, 0x64,                     // note on, key 60, velocity 100
+          0x00, 0xE0, 0x00, 0x40,                     // no bend
+          0x84, 0x00, 0x80, 0x3C, 0x00,               // 512 ticks later, note off
+          0x01, 0xFF, 0x2F, 0x00}},                   // end of track a tick later
+        // Data bytes never carry the status bit.
+        {[](MidiFileWriter& w) {
+             writeMidiNoteOn(w, 0, 0, 200, 300);
+             writeMidiControlChange(w, 0, 0, MIDI_CC_REVERB, -4);
+             writeMidiProgramChange(w, 0, 0, 128);
+         },
+         0,
+         {0x00, 0x90, 0x7F, 0x7F, 0x00, 0xB0, 0x5B, 0x00, 0x00, 0xC0, 0x7F, 0x00, 0xFF, 0x2F, 0x00}},
+        // Pitch bends go low seven bits first and stay within fourteen bits.
+        {[](MidiFileWriter& w) {
+             for (int value : {0, 8192, 16383, 9748, 192, 20000, -1}) writeMidiPitchBend(w, 0, 5, value);
+         },
+         0,
+         {0x00, 0xE5, 0x00, 0x00, 0x00, 0xE5, 0x00, 0x40, 0x00, 0xE5, 0x7F, 0x7F, 0x00, 0xE5, 0x14, 0x4C,
+          0x00, 0xE5, 0x40, 0x01, 0x00, 0xE5, 0x7F, 0x7F, 0x00, 0xE5, 0x00, 0x00, 0x00, 0xFF, 0x2F, 0x00}},
+        // A track name is counted in Latin-1 bytes.
+        {[](MidiFileWriter& w) { writeMidiTextEvent(w, 0, MIDI_META_TRACK_NAME, "Fl\xC3\xBBte"); },
+         0,
+         {0x00, 0xFF, 0x03, 0x05, 'F', 'l', 0xFB, 't', 'e', 0x00, 0xFF, 0x2F, 0x00}},
+    };
+    for (const Case& c : cases) {
+        MidiFileWriter w;
+        ASSERT_EQ(createMidiFile(w, path), 1);
+        writeMidiHeader(w, 1, 1, 256);
+        beginMidiTrack(w);
+        c.events(w);
+        endMidiTrack(w, c.endDelta);
+        ASSERT_EQ(finishMidiFile(w), 1);
+        Bytes expected = header(1);
+        append(expected, track(c.body));
+        EXPECT_EQ(readFileBytes(path), expected);
+    }
     EXPECT_EQ(messageCount(), 0);
 }
 
@@ -108,10 +135,7 @@ TEST_F(MidiFileChunks, EveryTrackGetsItsOwnLengthAndItsDeltasStartAtZero) {
                             0x00, 0xFF, 0x59, 0x02, 0x00, 0x00,
                             0x01, 0xFF, 0x2F, 0x00}));
     EXPECT_EQ(readFileBytes(path), expected);
-}
-
-TEST_F(MidiFileChunks, AnEventBeforeTheLastOneFollowsItWithDeltaZero) {
-    MidiFileWriter w;
+    // An event before the last one follows it with delta zero.
     ASSERT_EQ(createMidiFile(w, path), 1);
     writeMidiHeader(w, 1, 1, 256);
     beginMidiTrack(w);
@@ -120,45 +144,11 @@ TEST_F(MidiFileChunks, AnEventBeforeTheLastOneFollowsItWithDeltaZero) {
     writeMidiNoteOn(w, 101, 0, 62, 90);
     endMidiTrack(w, 0);
     ASSERT_EQ(finishMidiFile(w), 1);
-
     ReadMidiFile file = readMidiBytes(readFileBytes(path));
     ASSERT_EQ(file.error, "");
-    ASSERT_EQ(file.tracks[0].events.size(), 3u);
-    EXPECT_EQ(file.tracks[0].events[0].tick, 100u);
-    EXPECT_EQ(file.tracks[0].events[1].tick, 100u);
-    EXPECT_EQ(file.tracks[0].events[2].tick, 101u);
-}
-
-TEST_F(MidiFileChunks, DataBytesNeverCarryTheStatusBit) {
-    MidiFileWriter w;
-    ASSERT_EQ(createMidiFile(w, path), 1);
-    writeMidiHeader(w, 1, 1, 256);
-    beginMidiTrack(w);
-    writeMidiNoteOn(w, 0, 0, 200, 300);
-    writeMidiControlChange(w, 0, 0, MIDI_CC_REVERB, -4);
-    writeMidiProgramChange(w, 0, 0, 128);
-    endMidiTrack(w, 0);
-    ASSERT_EQ(finishMidiFile(w), 1);
-
-    Bytes expected = header(1);
-    append(expected, track({0x00, 0x90, 0x7F, 0x7F, 0x00, 0xB0, 0x5B, 0x00, 0x00, 0xC0, 0x7F, 0x00, 0xFF, 0x2F, 0x00}));
-    EXPECT_EQ(readFileBytes(path), expected);
-}
-
-TEST_F(MidiFileChunks, PitchBendsGoLowSevenBitsFirstAndStayWithinFourteenBits) {
-    MidiFileWriter w;
-    ASSERT_EQ(createMidiFile(w, path), 1);
-    writeMidiHeader(w, 1, 1, 256);
-    beginMidiTrack(w);
-    for (int value : {0, 8192, 16383, 9748, 192, 20000, -1}) writeMidiPitchBend(w, 0, 5, value);
-    endMidiTrack(w, 0);
-    ASSERT_EQ(finishMidiFile(w), 1);
-
-    Bytes expected = header(1);
-    append(expected, track({0x00, 0xE5, 0x00, 0x00, 0x00, 0xE5, 0x00, 0x40, 0x00, 0xE5, 0x7F, 0x7F,
-                            0x00, 0xE5, 0x14, 0x4C, 0x00, 0xE5, 0x40, 0x01, 0x00, 0xE5, 0x7F, 0x7F,
-                            0x00, 0xE5, 0x00, 0x00, 0x00, 0xFF, 0x2F, 0x00}));
-    EXPECT_EQ(readFileBytes(path), expected);
+    std::vector<uint32_t> ticks;
+    for (const ReadMidiEvent& e : file.tracks[0].events) ticks.push_back(e.tick);
+    EXPECT_EQ(ticks, (std::vector<uint32_t>{100, 100, 101}));
 }
 
 TEST(MidiFileText, TextIsWrittenInLatin1WithQuestionMarksForTheRest) {
@@ -169,19 +159,6 @@ TEST(MidiFileText, TextIsWrittenInLatin1WithQuestionMarksForTheRest) {
     EXPECT_EQ(latin1FromUtf8("\xC3("), "?(");                                  // cut short
     EXPECT_EQ(latin1FromUtf8("\xC0\x80" "a"), "??a");                          // overlong NUL
     EXPECT_EQ(latin1FromUtf8("\xE2\x99"), "??");                               // sequence past the end
-}
-
-TEST_F(MidiFileChunks, ATrackNameIsCountedInLatin1Bytes) {
-    MidiFileWriter w;
-    ASSERT_EQ(createMidiFile(w, path), 1);
-    writeMidiHeader(w, 1, 1, 256);
-    beginMidiTrack(w);
-    writeMidiTextEvent(w, 0, MIDI_META_TRACK_NAME, "Fl\xC3\xBBte");
-    endMidiTrack(w, 0);
-    ASSERT_EQ(finishMidiFile(w), 1);
-    Bytes expected = header(1);
-    append(expected, track({0x00, 0xFF, 0x03, 0x05, 'F', 'l', 0xFB, 't', 'e', 0x00, 0xFF, 0x2F, 0x00}));
-    EXPECT_EQ(readFileBytes(path), expected);
 }
 
 // ---- failures ----
@@ -210,34 +187,23 @@ TEST_F(MidiFileFailures, AFileThatCannotBeCreatedIsRefusedWithoutAMessage) {
     EXPECT_FALSE(fileExists(path));
 }
 
-TEST_F(MidiFileFailures, AShortWriteIsReportedOnceAndTheIncompleteFileRemoved) {
-    for (int n = 1; n <= 14; n++) {   // every write of the file, the length last
+// A short write (any of the file's writes, the lengths last), a seek that fails while filling
+// in lengths or a close that fails is reported once and the incomplete file removed.
+TEST_F(MidiFileFailures, AFailureIsReportedOnceAndTheIncompleteFileRemoved) {
+    std::vector<std::tuple<FileOp, int, const char*>> cases = {{FILE_OP_SEEK, 1, "File could not be seeked"},
+                                                               {FILE_OP_CLOSE, 1, "File could not be closed"}};
+    for (int n = 1; n <= 14; n++) cases.push_back({FILE_OP_WRITE, n, "Bytes were not stored properly"});
+    for (auto [op, n, text] : cases) {
         clearUiCalls();
-        failFileCall(FILE_OP_WRITE, n);
-        EXPECT_EQ(writeSmallFile(path), 0) << "write " << n;
-        EXPECT_EQ(messageCount(), 1) << "write " << n;
-        EXPECT_EQ(lastMessageText(), "Bytes were not stored properly");
-        EXPECT_FALSE(fileExists(path)) << "write " << n;
+        failFileCall(op, n);
+        EXPECT_EQ(writeSmallFile(path), 0) << text << " " << n;
+        EXPECT_EQ(messageCount(), 1) << text << " " << n;
+        EXPECT_EQ(lastMessageText(), text);
+        EXPECT_FALSE(fileExists(path)) << text << " " << n;
         clearFileFailures();
     }
-}
-
-TEST_F(MidiFileFailures, ASeekThatFailsWhileFillingInLengthsIsReported) {
-    failFileCall(FILE_OP_SEEK, 1);
-    EXPECT_EQ(writeSmallFile(path), 0);
-    EXPECT_EQ(messageCount(), 1);
-    EXPECT_EQ(lastMessageText(), "File could not be seeked");
-    EXPECT_FALSE(fileExists(path));
-}
-
-TEST_F(MidiFileFailures, ACloseThatFailsIsReportedAndTheFileRemoved) {
-    failFileCall(FILE_OP_CLOSE, 1);
-    EXPECT_EQ(writeSmallFile(path), 0);
-    EXPECT_EQ(lastMessageText(), "File could not be closed");
-    EXPECT_FALSE(fileExists(path));
-}
-
-TEST_F(MidiFileFailures, AWriterThatGivesUpLeavesNoFileBehind) {
+    // A writer that gives up leaves no file behind, and says nothing.
+    clearUiCalls();
     MidiFileWriter w;
     ASSERT_EQ(createMidiFile(w, path), 1);
     writeMidiHeader(w, 1, 1, 256);

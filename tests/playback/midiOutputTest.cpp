@@ -6,7 +6,6 @@
 
 #include <cmath>
 #include <cstring>
-#include <filesystem>
 #include <limits>
 #include <string>
 #include <vector>
@@ -26,7 +25,6 @@
 #include "store/song.h"
 #include "support/testSupport.h"
 
-namespace fs = std::filesystem;
 using Bytes = std::vector<uint8_t>;
 
 static const char* const CREDIT_LINE = "Made with Torvellan Melodrift";
@@ -39,19 +37,16 @@ struct DetailBlock {
     uint8_t amplitude;
 };
 
-class MidiOutputTest : public ::testing::Test {
+class MidiOutputTest : public SharedFolderTest {
 protected:
     void SetUp() override {
-        savedPaths = paths;
-        setSharedBasePath(folder.path());
-        makeFolder(paths.sharedFolder);
-        // The shipped General MIDI list of this source tree.
-        paths.resourcePath = fs::path(__FILE__).parent_path().parent_path().parent_path().string() + "/";
+        SharedFolderTest::SetUp();
+        paths.resourcePath = sourceRoot();   // the shipped General MIDI list
         clean();
     }
     void TearDown() override {
         clean();
-        paths = savedPaths;
+        SharedFolderTest::TearDown();
     }
     void clean() {
         closeFTFile(0);
@@ -63,9 +58,7 @@ protected:
         resetGeneralMidiTable();
         midiOutputOptions = MidiOutputOptions{};
         globalSettings.defaultInstrument = "Voice";
-        audioActivity = AudioActivity{false, false};
-        clearUiCalls();
-        clearFileFailures();
+        audioActivity = AudioActivity{};
     }
     // A song of count blocks of d seconds each.
     void makeSong(uint32_t count, double d) {
@@ -120,8 +113,6 @@ protected:
         EXPECT_EQ(file.error, "");
         return file;
     }
-    TempFolder folder;
-    Paths savedPaths;
     std::string path = folder.file("song.mid");
 };
 
@@ -164,7 +155,7 @@ TEST_F(MidiOutputFile, ASongWithoutNotesGivesTheTempoTrackAndOneInstrumentTrackW
 
 TEST_F(MidiOutputFile, TheTrackCarriesTheSongsInstrumentItsProgramAndTheReverbOption) {
     makeSong(640, 1.0 / 64);
-    midiOutputSong.instrumentName = "Fl\xC3\xBBte";   // matched by word, written in Latin-1
+    song.instrumentName = "Fl\xC3\xBBte";   // matched by word, written in Latin-1
     midiOutputOptions.reverb = false;
     ReadMidiFile file = writeAndRead(0);
     ASSERT_EQ(file.tracks.size(), 2u);
@@ -179,7 +170,7 @@ TEST_F(MidiOutputFile, TheTrackCarriesTheSongsInstrumentItsProgramAndTheReverbOp
     ASSERT_EQ(programs.size(), 1u);
     EXPECT_EQ(programs[0].data1, 1 - 1) << "an unknown name plays the first program";
 
-    midiOutputSong.instrumentName = "Flute";
+    song.instrumentName = "Flute";
     midiOutputOptions.reverb = true;
     midiOutputOptions.reverbDepth = 90;
     file = writeAndRead(0);
@@ -216,19 +207,11 @@ TEST_F(MidiOutputFile, SeveralPartsGetATrackEachAndTheTenthChannelIsSkipped) {
 
 // ---- velocities ----
 
-TEST(MidiOutputVelocity, LevelsGiveTheVelocitiesOfTheirCurve) {
-    EXPECT_EQ(velocityFromLevel(0.0f), 24);
-    EXPECT_EQ(velocityFromLevel(1.0f), 24);
-    EXPECT_EQ(velocityFromLevel(50.0f), 78);
-    EXPECT_EQ(velocityFromLevel(128.0f), 103);
-    EXPECT_EQ(velocityFromLevel(255.0f), 127);
-}
-
-TEST(MidiOutputVelocity, LevelsOutsideTheScaleStayWithinOneTo127) {
-    EXPECT_EQ(velocityFromLevel(-40.0f), 24);
-    EXPECT_EQ(velocityFromLevel(std::numeric_limits<float>::quiet_NaN()), 24);
-    EXPECT_EQ(velocityFromLevel(1.0e6f), 127);
-    EXPECT_EQ(velocityFromLevel(std::numeric_limits<float>::infinity()), 127);
+TEST(MidiOutputVelocity, LevelsGiveTheVelocitiesOfTheirCurveWithinOneTo127) {
+    const float nan = std::numeric_limits<float>::quiet_NaN(), inf = std::numeric_limits<float>::infinity();
+    const std::pair<float, int> cases[] = {{0.0f, 24},  {1.0f, 24},    {50.0f, 78},   {128.0f, 103}, {255.0f, 127},
+                                           {-40.0f, 24}, {nan, 24},    {1.0e6f, 127}, {inf, 127}};
+    for (auto [level, velocity] : cases) EXPECT_EQ(velocityFromLevel(level), velocity) << level;
 }
 
 // ---- plain notes ----
@@ -243,14 +226,9 @@ TEST_F(MidiOutputPlain, ANoteIsOnAtItsStartAndOffAtItsEndWithItsAverageLevel) {
     int unmatched = 0;
     std::vector<ReadNote> notes = notesOf(file, &unmatched);
     EXPECT_EQ(unmatched, 0);
+    EXPECT_EQ(ticksOf(notes), (std::vector<NoteTicks>{{69, 256, 512}, {60, 640, 1024}}));
     ASSERT_EQ(notes.size(), 2u);
-    EXPECT_EQ(notes[0].key, 69);
-    EXPECT_EQ(notes[0].onTick, 256u);
-    EXPECT_EQ(notes[0].offTick, 512u);
     EXPECT_EQ(notes[0].velocity, 103);
-    EXPECT_EQ(notes[1].key, 60);
-    EXPECT_EQ(notes[1].onTick, 640u);
-    EXPECT_EQ(notes[1].offTick, 1024u);
     EXPECT_EQ(notes[1].velocity, 78);
     // Note-offs carry velocity 0; the track ends one tick after its last event.
     std::vector<ReadMidiEvent> offs = eventsOfKind(file.tracks[1], 0x80);
@@ -259,49 +237,35 @@ TEST_F(MidiOutputPlain, ANoteIsOnAtItsStartAndOffAtItsEndWithItsAverageLevel) {
     EXPECT_EQ(file.tracks[1].endTick, 1025u);
 }
 
-TEST_F(MidiOutputPlain, ANoteOnItsKeyWritesNoBendUnlessTheTrackWasLeftBent) {
+TEST_F(MidiOutputPlain, ANoteOnItsKeyWritesNoBendUnlessTheTrackWasLeftBentAndBendsAndKeysAreLimited) {
     makeSong(640, 1.0 / 64);
     addNote(0.5, 1.0, 440.0);
     addNote(1.5, 2.0, 450.0);    // 38.9 cents sharp of A
     addNote(2.5, 3.0, 440.0);
     addNote(3.5, 4.0, 440.0);
-    ReadMidiFile file = writeAndRead(0);
-    std::vector<ReadMidiEvent> bends = eventsOfKind(file.tracks[1], 0xE0);
-    ASSERT_EQ(bends.size(), 2u);
-    EXPECT_EQ(bends[0].tick, 768u);
-    EXPECT_EQ(bends[0].data1 | bends[0].data2 << 7, 8192 + 1556);
-    EXPECT_EQ(bends[1].tick, 1280u) << "the next note on its key bends back";
-    EXPECT_EQ(bends[1].data1 | bends[1].data2 << 7, 8192);
-}
-
-TEST_F(MidiOutputPlain, BendsBeyondTheirRangeAreLimited) {
-    makeSong(640, 1.0 / 64);
-    addNote(0.5, 1.0, 440.0);
-    noteList.notes[0].pitch = 600.0f;   // five semitones above its key
-    addNote(1.5, 2.0, 440.0);
-    noteList.notes[1].pitch = 300.0f;
-    ReadMidiFile file = writeAndRead(0);
-    std::vector<ReadMidiEvent> bends = eventsOfKind(file.tracks[1], 0xE0);
-    ASSERT_EQ(bends.size(), 2u);
-    EXPECT_EQ(bends[0].data1 | bends[0].data2 << 7, 16383);
-    EXPECT_EQ(bends[1].data1 | bends[1].data2 << 7, 0);
-}
-
-TEST_F(MidiOutputPlain, KeysAboveTheMidiRangeArePlayedAtTheTopKey) {
-    makeSong(640, 1.0 / 64);
-    addNote(0.5, 1.0, 440.0);
-    noteList.notes[0].midiNote = 200;
+    addNote(4.5, 5.0, 440.0);
+    noteList.notes[4].pitch = 600.0f;   // five semitones above its key
+    addNote(5.5, 6.0, 440.0);
+    noteList.notes[5].pitch = 300.0f;
+    addNote(6.5, 7.0, 440.0);
+    noteList.notes[6].midiNote = 200;
     ReadMidiFile file = writeAndRead(0);   // the reader refuses any data byte of 128 or more
+    std::vector<ReadMidiEvent> bends = eventsOfKind(file.tracks[1], 0xE0);
+    auto value = [](const ReadMidiEvent& e) { return e.data1 | e.data2 << 7; };
+    ASSERT_EQ(bends.size(), 4u) << "the top key's bend is the one the track was left with";
+    // The next note on the first bent key bends back at 1280.
+    EXPECT_EQ(std::tuple(bends[0].tick, value(bends[0]), bends[1].tick, value(bends[1]), value(bends[2]), value(bends[3])),
+              std::tuple(768u, 8192 + 1556, 1280u, 8192, 16383, 0));
     std::vector<ReadNote> notes = notesOf(file);
-    ASSERT_EQ(notes.size(), 1u);
-    EXPECT_EQ(notes[0].key, 127);
+    ASSERT_EQ(notes.size(), 7u);
+    EXPECT_EQ(notes[6].key, 127) << "keys above the MIDI range play at the top key";
 }
 
 // ---- the range ----
 
 using MidiOutputRange = MidiOutputTest;
 
-TEST_F(MidiOutputRange, TheRangeStartIsTickZeroAndNotesKeepTheirOwnEnds) {
+TEST_F(MidiOutputRange, TheRangeStartIsTickZeroAndNotesKeepTheirOwnEndsAndMinusOneIsTheSongsEnd) {
     makeSong(640, 1.0 / 64);
     addNote(0.5, 1.0, 440.0);    // before the range
     addNote(1.5, 2.5, 440.0);    // starts before it
@@ -309,21 +273,13 @@ TEST_F(MidiOutputRange, TheRangeStartIsTickZeroAndNotesKeepTheirOwnEnds) {
     addNote(4.0, 4.5, 440.0);    // after it
     ReadMidiFile file = writeAndRead(0, 2.0, 3.25);
     std::vector<ReadNote> notes = notesOf(file);
-    ASSERT_EQ(notes.size(), 2u);
-    EXPECT_EQ(notes[0].onTick, 0u);
-    EXPECT_EQ(notes[0].offTick, 256u);
+    EXPECT_EQ(ticksOf(notes), (std::vector<NoteTicks>{{69, 0, 256}, {69, 512, 768}}));
     // The whole note's level sum over the 32 blocks written: 256 a block.
-    EXPECT_EQ(notes[0].velocity, 127);
-    EXPECT_EQ(notes[1].onTick, 512u);
-    EXPECT_EQ(notes[1].offTick, 768u);
-}
-
-TEST_F(MidiOutputRange, AtMinusOneTheRangeIsTheWholeSong) {
-    makeSong(640, 1.0 / 64);
-    addNote(0.0, 0.5, 440.0);
+    EXPECT_EQ(notes.at(0).velocity, 127);
+    // At -1 the range is the whole song.
     addNote(9.5, 10.0, 440.0);
-    EXPECT_EQ(notesOf(writeAndRead(0, -1.0, -1.0)).size(), 2u);
-    EXPECT_EQ(notesOf(writeAndRead(0, -1.0, 5.0)).size(), 1u);
+    EXPECT_EQ(notesOf(writeAndRead(0, -1.0, -1.0)).size(), 5u);
+    EXPECT_EQ(notesOf(writeAndRead(0, -1.0, 3.25)).size(), 3u);
     std::vector<ReadNote> late = notesOf(writeAndRead(0, 9.0, -1.0));
     ASSERT_EQ(late.size(), 1u);
     EXPECT_EQ(late[0].onTick, 256u);
@@ -343,34 +299,18 @@ protected:
     }
 };
 
-TEST_F(MidiOutputDetail, NotesALittleUnderHalfABlockApartAreJoinedIntoOne) {
+TEST_F(MidiOutputDetail, NotesAtMostHalfABlockApartAreJoinedIntoOne) {
     steadyBlocks(440.0f);
-    addNote(0.0, 10 * D, 440.0);
-    addNote(10.4 * D, 20 * D, 440.0);
-    std::vector<ReadNote> notes = notesOf(writeAndRead(1));
-    ASSERT_EQ(notes.size(), 1u);
-    EXPECT_EQ(notes[0].key, 69);
-    EXPECT_EQ(notes[0].onTick, 0u);
-    EXPECT_EQ(notes[0].offTick, 320u);
-    EXPECT_EQ(notes[0].velocity, 103);
-}
-
-TEST_F(MidiOutputDetail, AGapOfExactlyHalfABlockStillJoins) {
-    steadyBlocks(440.0f);
-    addNote(0.0, 10 * D, 440.0);
-    addNote(10.5 * D, 20 * D, 440.0);
-    EXPECT_EQ(notesOf(writeAndRead(1)).size(), 1u);
-}
-
-TEST_F(MidiOutputDetail, AGapOfMoreThanHalfABlockKeepsTheNotesApart) {
-    steadyBlocks(440.0f);
-    addNote(0.0, 10 * D, 440.0);
-    addNote(10.6 * D, 20 * D, 440.0);
-    std::vector<ReadNote> notes = notesOf(writeAndRead(1));
-    ASSERT_EQ(notes.size(), 2u);
-    EXPECT_EQ(notes[0].offTick, 160u);
-    EXPECT_EQ(notes[1].onTick, uint32_t(10.6 * D * 512));
-    EXPECT_EQ(notes[1].offTick, 320u);
+    for (double gap : {0.4, 0.5, 0.6}) {
+        resetNoteList();
+        addNote(0.0, 10 * D, 440.0);
+        addNote((10 + gap) * D, 20 * D, 440.0);
+        std::vector<ReadNote> notes = notesOf(writeAndRead(1));
+        std::vector<NoteTicks> expected{{69, 0, 320}};
+        if (gap > 0.5) expected = {{69, 0, 160}, {69, uint32_t((10 + gap) * D * 512), 320}};
+        EXPECT_EQ(ticksOf(notes), expected) << gap;
+        EXPECT_EQ(notes.at(0).velocity, 103);
+    }
 }
 
 TEST_F(MidiOutputDetail, NotesAreJoinedOnlyWhenBothSidesArePitchedAndClose) {
@@ -384,18 +324,8 @@ TEST_F(MidiOutputDetail, NotesAreJoinedOnlyWhenBothSidesArePitchedAndClose) {
     addNote(20 * D, 30 * D, 440.0);   // 1.6 further: a new note
     addNote(30 * D, 40 * D, 440.0);   // 3 down: a new note
     addNote(40 * D, 50 * D, 440.0);   // its predecessor's last block has no pitch: a new note
-    std::vector<ReadNote> notes = notesOf(writeAndRead(1));
-    ASSERT_EQ(notes.size(), 4u);
-    EXPECT_EQ(notes[0].key, 69);
-    EXPECT_EQ(notes[0].onTick, 0u);
-    EXPECT_EQ(notes[0].offTick, 320u);
-    EXPECT_EQ(notes[1].key, 72);
-    EXPECT_EQ(notes[1].onTick, 320u);
-    EXPECT_EQ(notes[1].offTick, 480u);
-    EXPECT_EQ(notes[2].onTick, 480u);
-    EXPECT_EQ(notes[2].offTick, 640u);
-    EXPECT_EQ(notes[3].onTick, 640u);
-    EXPECT_EQ(notes[3].offTick, 800u);
+    EXPECT_EQ(ticksOf(notesOf(writeAndRead(1))),
+              (std::vector<NoteTicks>{{69, 0, 320}, {72, 320, 480}, {69, 480, 640}, {69, 640, 800}}));
 }
 
 TEST_F(MidiOutputDetail, AGlideBeyondTheBendRangeIsRekeyedWhereTheBendWouldLeaveIt) {
@@ -408,15 +338,9 @@ TEST_F(MidiOutputDetail, AGlideBeyondTheBendRangeIsRekeyedWhereTheBendWouldLeave
     int unmatched = 0;
     std::vector<ReadNote> notes = notesOf(file, &unmatched);
     EXPECT_EQ(unmatched, 0);
-    ASSERT_EQ(notes.size(), 2u);
-    // Key 62 holds blocks 0 .. 16 within two semitones, further than 60 or 61 would.
-    EXPECT_EQ(notes[0].key, 62);
-    EXPECT_EQ(notes[0].onTick, 0u);
-    EXPECT_EQ(notes[0].offTick, 17u * 16);
-    // At block 17 (64.25) key 66 reaches the stretch's end.
-    EXPECT_EQ(notes[1].key, 66);
-    EXPECT_EQ(notes[1].onTick, 17u * 16);
-    EXPECT_EQ(notes[1].offTick, 512u);
+    // Key 62 holds blocks 0 .. 16 within two semitones, further than 60 or 61 would; at
+    // block 17 (64.25) key 66 reaches the stretch's end.
+    EXPECT_EQ(ticksOf(notes), (std::vector<NoteTicks>{{62, 0, 17 * 16}, {66, 17 * 16, 512}}));
 
     std::vector<ReadMidiEvent> bends = eventsOfKind(file.tracks[1], 0xE0);
     ASSERT_EQ(bends.size(), 32u) << "every block bends a little further";
@@ -437,23 +361,24 @@ TEST_F(MidiOutputDetail, EveryBlockWritesItsVolumeWhenItChanges) {
     ReadMidiFile file = writeAndRead(1);
     std::vector<ReadMidiEvent> volumes = eventsOfKind(file.tracks[1], 0xB0);
     volumes.erase(volumes.begin(), volumes.begin() + 4);   // the track's opening controllers
-    ASSERT_EQ(volumes.size(), 2u);
-    EXPECT_EQ(volumes[0].data1, 7);
-    EXPECT_EQ(volumes[0].data2, 78);
-    EXPECT_EQ(volumes[0].tick, 160u);
-    EXPECT_EQ(volumes[1].data2, 127);
-    EXPECT_EQ(volumes[1].tick, 320u);
+    std::vector<std::tuple<int, int, uint32_t>> written;   // controller, value, tick
+    for (const ReadMidiEvent& e : volumes) written.emplace_back(e.data1, e.data2, e.tick);
+    EXPECT_EQ(written, (std::vector<std::tuple<int, int, uint32_t>>{{7, 78, 160}, {7, 127, 320}}));
     std::vector<ReadMidiEvent> bends = eventsOfKind(file.tracks[1], 0xE0);
     ASSERT_EQ(bends.size(), 1u) << "a steady pitch bends once, at the start";
     EXPECT_EQ(bends[0].data1 | bends[0].data2 << 7, 8192);
 }
 
-TEST_F(MidiOutputDetail, ANoteWithoutPitchedBlocksIsLeftOut) {
+TEST_F(MidiOutputDetail, ANoteWithoutPitchedBlocksOrWithoutAnFTFileIsLeftOut) {
+    addNote(0.0, 10 * D, 440.0);
+    addNote(20 * D, 30 * D, 440.0);
+    setFTBlockWindowCapacity(D);
+    EXPECT_EQ(notesOf(writeAndRead(1)).size(), 0u) << "no FT file";
+    EXPECT_EQ(messageCount(), 1) << "reported once, not for every block";
+    EXPECT_EQ(lastMessageText(), "Could not open FT file - openFTFile (2)");
     std::vector<DetailBlock> blocks(64, DetailBlock{440.0f, 128});
     for (int b = 20; b < 30; b++) blocks[b].frequency = 0.0f;
     storeDetailBlocks(blocks);
-    addNote(0.0, 10 * D, 440.0);
-    addNote(20 * D, 30 * D, 440.0);
     EXPECT_EQ(notesOf(writeAndRead(1)).size(), 1u);
     EXPECT_EQ(notesOf(writeAndRead(0)).size(), 2u) << "plain mode does not look at the blocks";
 }
@@ -479,9 +404,7 @@ TEST_F(MidiOutputDetail, AStretchLongerThanTheBlockWindowIsFollowedToItsEnd) {
     addNote(0.0, 640 * D, 440.0);
     addNote(640 * D, 1280 * D, 440.0);
     ReadMidiFile file = writeAndRead(1);
-    std::vector<ReadNote> notes = notesOf(file);
-    ASSERT_EQ(notes.size(), 1u);
-    EXPECT_EQ(notes[0].offTick, 1280u * 16);
+    EXPECT_EQ(ticksOf(notesOf(file)), (std::vector<NoteTicks>{{69, 0, 1280 * 16}}));
     std::vector<ReadMidiEvent> bends = eventsOfKind(file.tracks[1], 0xE0);
     ASSERT_EQ(bends.size(), 2u);
     EXPECT_EQ(bends[1].tick, 1200u * 16);
@@ -489,20 +412,11 @@ TEST_F(MidiOutputDetail, AStretchLongerThanTheBlockWindowIsFollowedToItsEnd) {
     EXPECT_EQ(messageCount(), 0);
 }
 
-TEST_F(MidiOutputDetail, WithoutAnFTFileNotesAreLeftOutAndOneMessageIsShown) {
-    addNote(0.0, 10 * D, 440.0);
-    addNote(20 * D, 30 * D, 440.0);
-    setFTBlockWindowCapacity(D);
-    EXPECT_EQ(notesOf(writeAndRead(1)).size(), 0u);
-    EXPECT_EQ(messageCount(), 1) << "reported once, not for every block";
-    EXPECT_EQ(lastMessageText(), "Could not open FT file - openFTFile (2)");
-}
-
 // ---- the writer's run ----
 
 using MidiOutputRun = MidiOutputTest;
 
-TEST_F(MidiOutputRun, TheWaitCursorAndStatusTextShowWhileWritingAndAreTakenBack) {
+TEST_F(MidiOutputRun, TheWaitCursorAndStatusTextShowWhileWritingAndAreTakenBackAfterAFailureToo) {
     makeSong(640, 1.0 / 64);
     addNote(0.5, 1.0, 440.0);
     ASSERT_EQ(writeNotesMidiFile(path, 0, 1, -1.0, -1.0), 1);
@@ -515,9 +429,18 @@ TEST_F(MidiOutputRun, TheWaitCursorAndStatusTextShowWhileWritingAndAreTakenBack)
                                                                  {UI_STATUS_TEXT, "Generating MIDI..."},
                                                                  {UI_WAIT_CURSOR, "off"},
                                                                  {UI_STATUS_TEXT, ""}}));
+    // A write that fails is reported and leaves neither the file nor the status text.
+    clearUiCalls();
+    failFileCall(FILE_OP_WRITE, 20);
+    EXPECT_EQ(writeNotesMidiFile(path, 0, 0, -1.0, -1.0), 0);
+    EXPECT_EQ(messageCount(), 1);
+    EXPECT_EQ(lastMessageText(), "Bytes were not stored properly");
+    EXPECT_FALSE(fileExists(path));
+    EXPECT_EQ(uiCalls().back().call, UI_STATUS_TEXT);
+    EXPECT_EQ(uiCalls().back().text, "");
 }
 
-TEST_F(MidiOutputRun, NothingIsWrittenWhileARecordingOrAnOpeningRuns) {
+TEST_F(MidiOutputRun, NothingIsWrittenWhileARecordingOrAnOpeningRunsOrWhenTheFileCannotBeCreated) {
     makeSong(640, 1.0 / 64);
     addNote(0.5, 1.0, 440.0);
     audioActivity.recording = true;
@@ -526,46 +449,17 @@ TEST_F(MidiOutputRun, NothingIsWrittenWhileARecordingOrAnOpeningRuns) {
     EXPECT_EQ(writeNotesMidiFile(path, 1, 1, -1.0, -1.0), 0);
     EXPECT_EQ(saveMidiFile(path, 0, 0), 0);
     EXPECT_FALSE(fileExists(path));
-    EXPECT_TRUE(uiCalls().empty());
-}
-
-TEST_F(MidiOutputRun, AFileThatCannotBeCreatedGivesZeroWithoutAMessage) {
-    makeSong(640, 1.0 / 64);
-    std::string nowhere = folder.file("missing folder/Temp0001.dat");
-    EXPECT_EQ(writeNotesMidiFile(nowhere, 0, 1, -1.0, -1.0), 0);
+    audioActivity = AudioActivity{};
+    EXPECT_EQ(writeNotesMidiFile(folder.file("missing folder/Temp0001.dat"), 0, 1, -1.0, -1.0), 0);
     EXPECT_TRUE(uiCalls().empty()) << "no message, and no status text for a file never begun";
-}
-
-TEST_F(MidiOutputRun, AWriteThatFailsIsReportedAndLeavesNeitherFileNorStatusText) {
-    makeSong(640, 1.0 / 64);
-    addNote(0.5, 1.0, 440.0);
-    failFileCall(FILE_OP_WRITE, 20);
-    EXPECT_EQ(writeNotesMidiFile(path, 0, 0, -1.0, -1.0), 0);
-    EXPECT_EQ(messageCount(), 1);
-    EXPECT_EQ(lastMessageText(), "Bytes were not stored properly");
-    EXPECT_FALSE(fileExists(path));
-    ASSERT_FALSE(uiCalls().empty());
-    EXPECT_EQ(uiCalls().back().call, UI_STATUS_TEXT);
-    EXPECT_EQ(uiCalls().back().text, "");
+    std::string nowhere = folder.file("missing folder/song.mid");
+    EXPECT_EQ(saveMidiFile(nowhere, 0, 0), 0);
+    EXPECT_EQ(lastMessageText(), "Cannot " + nowhere) << "saving reports it";
 }
 
 // ---- saving ----
 
 using MidiOutputSave = MidiOutputTest;
-
-TEST_F(MidiOutputSave, ADetailSaveFollowsTheBlocks) {
-    makeSong(640, 1.0 / 64);
-    addNote(0.5, 1.0, 440.0);
-    std::vector<DetailBlock> blocks(640, DetailBlock{440.0f, 128});
-    for (int b = 48; b < 64; b++) blocks[b].frequency = 450.0f;
-    storeDetailBlocks(blocks);
-    ASSERT_EQ(saveMidiFile(path, 1, 0), 1);
-    ReadMidiFile file = readMidiBytes(readFileBytes(path));
-    EXPECT_EQ(notesOf(file).size(), 1u);
-    EXPECT_EQ(eventsOfKind(file.tracks[1], 0xE0).size(), 2u);
-    ASSERT_EQ(saveMidiFile(path, 0, 0), 1);
-    EXPECT_EQ(eventsOfKind(readMidiBytes(readFileBytes(path)).tracks[1], 0xE0).size(), 0u);
-}
 
 TEST_F(MidiOutputSave, OnlyTheSelectedRangeIsSavedWhenAskedAndLongerThanHalfABlock) {
     makeSong(640, 1.0 / 64);
@@ -585,13 +479,18 @@ TEST_F(MidiOutputSave, OnlyTheSelectedRangeIsSavedWhenAskedAndLongerThanHalfABlo
     selection.timeSelectionEnd = 2.0f + 1.0f / 128;   // exactly half a block
     ASSERT_EQ(saveMidiFile(path, 0, 1), 1);
     EXPECT_EQ(notesOf(readMidiBytes(readFileBytes(path))).size(), 3u);
-}
-
-TEST_F(MidiOutputSave, AFileThatCannotBeCreatedIsReported) {
-    makeSong(640, 1.0 / 64);
-    std::string nowhere = folder.file("missing folder/song.mid");
-    EXPECT_EQ(saveMidiFile(nowhere, 0, 0), 0);
-    EXPECT_EQ(lastMessageText(), "Cannot " + nowhere);
+    // A detail save follows the blocks.
+    resetNoteList();
+    addNote(0.5, 1.0, 440.0);
+    std::vector<DetailBlock> blocks(640, DetailBlock{440.0f, 128});
+    for (int b = 48; b < 64; b++) blocks[b].frequency = 450.0f;
+    storeDetailBlocks(blocks);
+    ASSERT_EQ(saveMidiFile(path, 1, 0), 1);
+    ReadMidiFile file = readMidiBytes(readFileBytes(path));
+    EXPECT_EQ(notesOf(file).size(), 1u);
+    EXPECT_EQ(eventsOfKind(file.tracks[1], 0xE0).size(), 2u);
+    ASSERT_EQ(saveMidiFile(path, 0, 0), 1);
+    EXPECT_EQ(eventsOfKind(readMidiBytes(readFileBytes(path)).tracks[1], 0xE0).size(), 0u) << "a plain save does not";
 }
 
 // ---- round trips ----
@@ -666,12 +565,9 @@ TEST_F(MidiOutputRoundTrip, DetailStretchesComeBackAsOneNoteEachOnTheSungKey) {
 
 using MidiOutputScale = MidiOutputTest;
 
-TEST_F(MidiOutputScale, TheScaleFileNameFollowsTheDefinitionsParameters) {
+TEST_F(MidiOutputScale, AChromaticScaleOfSeparateNotesIsWrittenAtItsTimesUnderItsParametersName) {
     EXPECT_EQ(scaleMidiFileName("Flute", 60, 71, 1.0, 128), "Flute_60_71_1.0_128.mid");
     EXPECT_EQ(scaleMidiFileName("Alto sax", 49, 80, 0.26, 90), "Alto sax_49_80_0.3_90.mid");
-}
-
-TEST_F(MidiOutputScale, AChromaticScaleOfSeparateNotesIsWrittenAtItsTimes) {
     ASSERT_EQ(writeScaleMidiFile(path, "Flute", 60, 64, 0.5, 128), 1);
     ReadMidiFile file = readMidiBytes(readFileBytes(path));
     ASSERT_EQ(file.error, "");
@@ -686,9 +582,7 @@ TEST_F(MidiOutputScale, AChromaticScaleOfSeparateNotesIsWrittenAtItsTimes) {
     std::vector<ReadNote> notes = notesOf(file);
     ASSERT_EQ(notes.size(), 5u);
     for (int k = 0; k < 5; k++) {
-        EXPECT_EQ(notes[k].key, 60 + k);
-        EXPECT_EQ(notes[k].velocity, 103);
-        EXPECT_EQ(notes[k].onTick, uint32_t(480 * k));
+        EXPECT_EQ(std::tuple(notes[k].key, notes[k].velocity, notes[k].onTick), std::tuple(60 + k, 103, 480u * k));
         EXPECT_NEAR(notes[k].onSeconds, 1.0 * k, 1e-9);
         EXPECT_NEAR(notes[k].offSeconds, 1.0 * k + 0.5, 1e-9);
     }

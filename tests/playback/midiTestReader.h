@@ -7,6 +7,7 @@
 #include <cstdint>
 #include <map>
 #include <string>
+#include <tuple>
 #include <utility>
 #include <vector>
 
@@ -189,6 +190,14 @@ inline std::vector<ReadNote> notesOf(const ReadMidiFile& file, int* unmatched = 
     }
     if (unmatched) *unmatched = lost;
     return notes;
+}
+
+// Each note as (key, on tick, off tick), to compare whole songs at once.
+using NoteTicks = std::tuple<int, uint32_t, uint32_t>;
+inline std::vector<NoteTicks> ticksOf(const std::vector<ReadNote>& notes) {
+    std::vector<NoteTicks> ticks;
+    for (const ReadNote& n : notes) ticks.emplace_back(n.key, n.onTick, n.offTick);
+    return ticks;
 }
 
 // The channel events of one kind (status high half) of a track, in order.

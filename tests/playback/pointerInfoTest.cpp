@@ -4,6 +4,8 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <string>
+#include <tuple>
 
 #include "analysis/recognitionOptions.h"
 #include "audio/audioActivity.h"
@@ -53,99 +55,70 @@ protected:
     static int xOf(double t) { return timeToX(t); }
 };
 
-using PointerInfoFormats = PointerInfoTest;
+// The texts the strip shows: kind, the two times, pitch name and frequency.
+struct InfoTexts {
+    std::string kind, firstTime, secondTime, pitchName, frequencyText;
+};
 
-TEST_F(PointerInfoFormats, TimesShowMinutesAndHundredthsAndNegativeTimesShowZero) {
-    EXPECT_EQ(formatSongTime(75.5), "1:15.50");
-    EXPECT_EQ(formatSongTime(3.25), "0:03.25");
-    EXPECT_EQ(formatSongTime(0.0), "0:00.00");
-    EXPECT_EQ(formatSongTime(-3.0), "0:00.00");
-    EXPECT_EQ(formatSongTime(600.0), "10:00.00");
+void expectInfo(const InfoTexts& expected) {
+    const PointerInfo& p = pointerInfo;
+    EXPECT_EQ(std::tuple(p.kind, p.firstTime, p.secondTime, p.pitchName, p.frequencyText),
+              std::tuple(expected.kind, expected.firstTime, expected.secondTime, expected.pitchName, expected.frequencyText));
 }
 
-TEST_F(PointerInfoFormats, FrequenciesShowWholeHertz) {
+TEST(PointerInfoFormats, TimesShowMinutesAndHundredthsFrequenciesWholeHertz) {
+    const std::pair<double, const char*> times[] = {
+        {75.5, "1:15.50"}, {3.25, "0:03.25"}, {0.0, "0:00.00"}, {-3.0, "0:00.00"}, {600.0, "10:00.00"}};
+    for (auto [t, text] : times) EXPECT_EQ(formatSongTime(t), text) << t;
     EXPECT_EQ(formatFrequencyText(440.4), "440Hz");
     EXPECT_EQ(formatFrequencyText(261.63), "262Hz");
-}
-
-TEST_F(PointerInfoFormats, TheRecordingLoadTextNamesLatencyAndProcessor) {
     EXPECT_EQ(recordingLoadText(0.3, 37.4), "Latency 0.3s  Processor 37%");
 }
 
 using PointerInfoKinds = PointerInfoTest;
 
-TEST_F(PointerInfoKinds, InsideTheTimeSelectionShowsItsEnds) {
+// Over the selection, a note (its pitch only in Note mode), a barline or empty space (the
+// pitch under the pointer, spelled diatonically), left of the song.
+TEST_F(PointerInfoKinds, ThePointerGetsTheKindOfWhatLiesUnderIt) {
+    barlineList.times[0] = 2.5f;
+    barlineList.count = 1;
     selection.timeSelectionStart = 1.0f;
     selection.timeSelectionEnd = 2.0f;
     updatePointerInfo(xOf(1.5), 300);
-    EXPECT_EQ(pointerInfo.kind, "SELECTION");
-    EXPECT_EQ(pointerInfo.firstTime, "0:01.00");
-    EXPECT_EQ(pointerInfo.secondTime, "0:02.00");
-    EXPECT_EQ(pointerInfo.pitchName, "");
-    updatePointerInfo(xOf(2.5), 300);
-    EXPECT_EQ(pointerInfo.kind, "POINTER");
-}
-
-TEST_F(PointerInfoKinds, ANoteInNoteModeShowsItsSpanPitchAndFrequency) {
-    displayModes.noteMode = NOTE_MODE_NOTE;
-    selection.pointerNote = 0;
-    updatePointerInfo(xOf(0.3), 300);
-    EXPECT_EQ(pointerInfo.kind, "NOTE");
-    EXPECT_EQ(pointerInfo.firstTime, "0:00.25");
-    EXPECT_EQ(pointerInfo.secondTime, "0:00.50");
-    EXPECT_EQ(pointerInfo.pitchName, "C4");
-    EXPECT_EQ(pointerInfo.frequencyText, "262Hz");
-}
-
-TEST_F(PointerInfoKinds, ANoteInDetailModeShowsOnlyItsSpan) {
-    selection.pointerNote = 0;
-    updatePointerInfo(xOf(0.3), 300);
-    EXPECT_EQ(pointerInfo.kind, "NOTE");
-    EXPECT_EQ(pointerInfo.secondTime, "0:00.50");
-    EXPECT_EQ(pointerInfo.pitchName, "");
-    EXPECT_EQ(pointerInfo.frequencyText, "");
-}
-
-TEST_F(PointerInfoKinds, EmptySpaceShowsThePitchUnderThePointerSpelledDiatonically) {
+    expectInfo({"SELECTION", "0:01.00", "0:02.00", "", ""});
     updatePointerInfo(xOf(3.0), plotBottom());
-    EXPECT_EQ(pointerInfo.kind, "POINTER");
-    EXPECT_EQ(pointerInfo.firstTime, "0:03.00");
-    EXPECT_EQ(pointerInfo.secondTime, "");
-    EXPECT_EQ(pointerInfo.pitchName, "B0");
-    EXPECT_EQ(pointerInfo.frequencyText, "31Hz");
+    expectInfo({"POINTER", "0:03.00", "", "B0", "31Hz"});
     updatePointerInfo(xOf(3.0), semitoneLineY(70) - 1);
-    EXPECT_EQ(pointerInfo.pitchName, "Bb4");
-}
-
-TEST_F(PointerInfoKinds, ABarlineShowsItsTime) {
-    barlineList.times[0] = 2.5f;
-    barlineList.count = 1;
+    expectInfo({"POINTER", "0:03.00", "", "Bb4", "469Hz"});   // a pixel above the line
+    updatePointerInfo(10, plotBottom());
+    expectInfo({"POINTER", "0:00.00", "", "B0", "31Hz"});
+    selection.pointerNote = 0;
+    updatePointerInfo(xOf(0.3), 300);
+    expectInfo({"NOTE", "0:00.25", "0:00.50", "", ""});
+    displayModes.noteMode = NOTE_MODE_NOTE;
+    refreshPointerInfo();
+    expectInfo({"NOTE", "0:00.25", "0:00.50", "C4", "262Hz"});
+    selection.pointerNote = -1;
     selection.pointerBarline = 0;
     updatePointerInfo(xOf(2.5), 300);
-    EXPECT_EQ(pointerInfo.kind, "BARLINE");
-    EXPECT_EQ(pointerInfo.firstTime, "0:02.50");
-}
-
-TEST_F(PointerInfoKinds, LeftOfTheSongTheTimeShowsZero) {
-    updatePointerInfo(10, 300);
-    EXPECT_EQ(pointerInfo.firstTime, "0:00.00");
+    expectInfo({"BARLINE", "0:02.50", "", "", ""});
 }
 
 TEST_F(PointerInfoKinds, BusyStatesShowTheirWordsAndSeparators) {
     EXPECT_STREQ(infoTimeSeparator(), "-");
     audioActivity.opening = true;
+    audioActivity.openingSeconds = 75.5;
     updatePointerInfo(xOf(1.0), 300);
-    EXPECT_EQ(pointerInfo.kind, "OPENING");
+    expectInfo({"OPENING", "0:10.00", "1:15.50", "", ""});
     EXPECT_STREQ(infoTimeSeparator(), "/");
-    audioActivity.opening = false;
-    audioActivity.recording = true;
+    audioActivity = AudioActivity{true, false, 0.0};
     updatePointerInfo(xOf(1.0), 300);
-    EXPECT_EQ(pointerInfo.kind, "RECORDING");
-    EXPECT_EQ(pointerInfo.firstTime, "0:10.00");
+    expectInfo({"RECORDING", "0:10.00", "", "", ""});
+    EXPECT_STREQ(infoTimeSeparator(), "/");
     audioActivity.recording = false;
     pointerInfo.finishing = true;
     refreshPointerInfo();
-    EXPECT_EQ(pointerInfo.kind, "FINISHING...");
+    expectInfo({"FINISHING...", "0:10.00", "", "", ""});
 }
 
 TEST_F(PointerInfoKinds, PlaybackShowsTheCursorAndTheNoteItPlays) {
@@ -154,10 +127,7 @@ TEST_F(PointerInfoKinds, PlaybackShowsTheCursorAndTheNoteItPlays) {
     playbackState.end = 1000;
     selection.pointerNote = 0;
     updatePointerInfo(xOf(5.0), 300);
-    EXPECT_EQ(pointerInfo.kind, "PLAYBACK");
-    EXPECT_EQ(pointerInfo.firstTime, "0:00.30");
-    EXPECT_EQ(pointerInfo.secondTime, "0:10.00");
-    EXPECT_EQ(pointerInfo.pitchName, "C4");
+    expectInfo({"PLAYBACK", "0:00.30", "0:10.00", "C4", "262Hz"});
     EXPECT_GT(pointerInfo.tuningKey, 261.0);
 }
 
@@ -173,14 +143,11 @@ TEST_F(PointerInfoTuning, SegmentsSitEitherSideOfTheCentreMark) {
     EXPECT_LT(TUNING_CENTRE_X + TUNING_CENTRE_WIDTH, tuningSegmentLeft(5));
 }
 
-TEST_F(PointerInfoTuning, WithinTheToleranceNoSegmentIsLit) {
+TEST_F(PointerInfoTuning, AFlatNoteLightsLeftwardsASharpOneRightwardsAndNoneWithinTheTolerance) {
     EXPECT_EQ(tuningDeviationSegments(440.0, 440.0), 0);
     EXPECT_EQ(tuningDeviationSegments(440.0 * std::pow(2.0, 5.0 / 1200), 440.0), 0);
     EXPECT_EQ(tuningDeviationSegments(0.0, 440.0), 0);
     for (int i = 0; i < TUNING_SEGMENTS; i++) EXPECT_EQ(tuningSegmentLit(i, 0), 0);
-}
-
-TEST_F(PointerInfoTuning, AFlatNoteLightsLeftwardsASharpOneRightwards) {
     int flat = tuningDeviationSegments(440.0 * std::pow(2.0, -25.0 / 1200), 440.0);
     EXPECT_EQ(flat, -2);
     EXPECT_EQ(tuningSegmentLit(4, flat), 1);

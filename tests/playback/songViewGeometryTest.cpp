@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <tuple>
 
 #include "analysis/pitchScale.h"
 #include "analysis/recognitionOptions.h"
@@ -46,18 +47,13 @@ protected:
 
 using SongViewPitchNames = SongViewGeometryTest;
 
-TEST_F(SongViewPitchNames, MiddleAAndMiddleCCarryOctaveFour) {
-    EXPECT_EQ(pitchName(69, true, PITCH_NAMES_CHROMATIC), "A4");
-    EXPECT_EQ(pitchName(60, true, PITCH_NAMES_CHROMATIC), "C4");
-    EXPECT_EQ(pitchName(59, true, PITCH_NAMES_DIATONIC), "B3");
-}
-
-TEST_F(SongViewPitchNames, SharpsAreSpelledByTheChosenNames) {
-    EXPECT_EQ(pitchName(61, true, PITCH_NAMES_CHROMATIC), "C#/Db4");
-    EXPECT_EQ(pitchName(61, true, PITCH_NAMES_DIATONIC), "C#4");
-    EXPECT_EQ(pitchName(70, true, PITCH_NAMES_DIATONIC), "Bb4");
-    EXPECT_EQ(pitchName(63, false, PITCH_NAMES_DIATONIC), "Eb");
-    EXPECT_EQ(pitchName(66, false, PITCH_NAMES_CHROMATIC), "F#/Gb");
+TEST_F(SongViewPitchNames, MiddleAAndMiddleCCarryOctaveFourAndSharpsAreSpelledByTheChosenNames) {
+    const std::tuple<int, bool, int, const char*> cases[] = {
+        {69, true, PITCH_NAMES_CHROMATIC, "A4"},     {60, true, PITCH_NAMES_CHROMATIC, "C4"},
+        {59, true, PITCH_NAMES_DIATONIC, "B3"},      {61, true, PITCH_NAMES_CHROMATIC, "C#/Db4"},
+        {61, true, PITCH_NAMES_DIATONIC, "C#4"},     {70, true, PITCH_NAMES_DIATONIC, "Bb4"},
+        {63, false, PITCH_NAMES_DIATONIC, "Eb"},     {66, false, PITCH_NAMES_CHROMATIC, "F#/Gb"}};
+    for (auto [semitone, octave, names, text] : cases) EXPECT_EQ(pitchName(semitone, octave, names), text) << semitone;
 }
 
 using SongViewPitchRange = SongViewGeometryTest;
@@ -126,16 +122,13 @@ TEST_F(SongViewDiatonic, TheBisectionFindsTheFrequencyOfAPixel) {
     for (int y = 20; y < 600; y += 53) EXPECT_NEAR(pitchToY(yToPitch(y)), y, 1) << y;
 }
 
-TEST_F(SongViewDiatonic, BothBitsDrawAtTheMeanOfTheTwoLayouts) {
+TEST_F(SongViewDiatonic, BothBitsDrawAtTheMeanOfTheTwoLayoutsAndNoBitAtZero) {
     layout(SCALE_MODE_CHROMATIC | SCALE_MODE_DIATONIC);
     EXPECT_EQ(chromaticY(440.0), 230);
     EXPECT_EQ(diatonicY(440.0), 226);
     EXPECT_EQ(pitchToY(440.0), 228);
     EXPECT_NEAR(pitchToY(yToPitch(300)), 300, 1);
-}
-
-TEST_F(SongViewDiatonic, NoLayoutBitPutsEverythingAtZero) {
-    layout(0);
+    layout(0);   // no layout bit puts everything at 0
     EXPECT_EQ(pitchToY(440.0), 0);
     EXPECT_EQ(yToPitch(300), 0.0);
 }
@@ -150,10 +143,7 @@ TEST_F(SongViewDiatonic, TheCacheIsClearedWhenThePlotHeightOrRangeChanges) {
     layoutSongView(LABEL_COLUMN_WIDTH + 1000, 830);
     EXPECT_EQ(diatonicY(440.0), 802 - 372);            // 20 of 43 steps
     generalSettings = GeneralSettings{};
-}
-
-TEST_F(SongViewDiatonic, ScrollingMovesCachedPitchesWithThePlot) {
-    globalSettings.scaleMode = SCALE_MODE_DIATONIC;
+    // Scrolling moves cached pitches with the plot.
     layoutSongView(LABEL_COLUMN_WIDTH + 1000, 200);
     int before = diatonicY(440.0);
     setSongViewScroll(0, 100);
@@ -210,10 +200,7 @@ TEST_F(SongViewZoom, SetZoomKeepsTheTimeUnderTheAnchorPut) {
     EXPECT_EQ(timeToX(t), 564);
     setZoom(2.0, 564);
     EXPECT_EQ(timeToX(t), 564);
-}
-
-TEST_F(SongViewZoom, ZoomingOutAtTheEndStaysWithinTheScrollRange) {
-    layout(SCALE_MODE_CHROMATIC);
+    // Zooming out at the end stays within the scroll range.
     setSongViewScroll(maxScrollX(), 0);
     setZoom(2.0, LABEL_COLUMN_WIDTH + 1000);
     EXPECT_EQ(songViewGeometry.scrollX, 60 * 64 - 1000);
@@ -245,36 +232,22 @@ TEST_F(SongViewZoom, FitToWindowShowsTheWholeSongWithinTheLimits) {
 
 using SongViewAutoScroll = SongViewGeometryTest;
 
-TEST_F(SongViewAutoScroll, ACursorWithinTheBandLeavesTheView) {
+// A cursor within the band leaves the view; one past seven eighths is brought to the left edge,
+// unless the end time stops it at seven eighths; one left of the view scrolls back, not below 0.
+TEST_F(SongViewAutoScroll, TheViewFollowsTheCursor) {
     layout(SCALE_MODE_CHROMATIC);
-    EXPECT_EQ(autoScrollSongView(3.0, 60.0), 0);
-    EXPECT_EQ(songViewGeometry.scrollX, 0);
-}
-
-TEST_F(SongViewAutoScroll, ACursorPastSevenEighthsIsBroughtToTheLeftEdge) {
-    layout(SCALE_MODE_CHROMATIC);
-    EXPECT_EQ(autoScrollSongView(8.0, 60.0), 1);
-    EXPECT_EQ(timeToX(8.0), LABEL_COLUMN_WIDTH + 6);
-}
-
-TEST_F(SongViewAutoScroll, TheEndTimeStopsAtSevenEighths) {
-    layout(SCALE_MODE_CHROMATIC);
-    EXPECT_EQ(autoScrollSongView(45.0, 50.0), 1);
-    EXPECT_EQ(timeToX(50.0), LABEL_COLUMN_WIDTH + 875);
-}
-
-TEST_F(SongViewAutoScroll, ACursorLeftOfTheViewScrollsBackButNotBelowZero) {
-    layout(SCALE_MODE_CHROMATIC);
-    setSongViewScroll(3000, 0);
-    EXPECT_EQ(autoScrollSongView(1.0, 60.0), 1);
-    EXPECT_EQ(songViewGeometry.scrollX, 122);
-    setSongViewScroll(3000, 0);
-    EXPECT_EQ(autoScrollSongView(0.01, 60.0), 1);
-    EXPECT_EQ(songViewGeometry.scrollX, 0);
-}
-
-TEST_F(SongViewAutoScroll, ScrollingToTheEndShowsTheNewestPart) {
-    layout(SCALE_MODE_CHROMATIC);
+    struct Case {
+        int scrollX;
+        double cursor, end;
+        int scrolled, expectedScrollX;
+    } cases[] = {{0, 3.0, 60.0, 0, 0}, {0, 8.0, 60.0, 1, 8 * 128 - 6}, {0, 45.0, 50.0, 1, 50 * 128 - 875},
+                 {3000, 1.0, 60.0, 1, 122}, {3000, 0.01, 60.0, 1, 0}};
+    for (const Case& c : cases) {
+        setSongViewScroll(c.scrollX, 0);
+        EXPECT_EQ(autoScrollSongView(c.cursor, c.end), c.scrolled) << c.cursor;
+        EXPECT_EQ(songViewGeometry.scrollX, c.expectedScrollX) << c.cursor;
+    }
+    setSongViewScroll(0, 0);
     EXPECT_EQ(scrollToSongEnd(), 1);
     EXPECT_EQ(timeToX(songDuration()), LABEL_COLUMN_WIDTH + 1000);
     EXPECT_EQ(scrollToSongEnd(), 0);

@@ -5,6 +5,7 @@
 #include <cstdint>
 #include <filesystem>
 #include <set>
+#include <tuple>
 #include <string>
 #include <vector>
 
@@ -17,29 +18,29 @@
 namespace fs = std::filesystem;
 
 // Each test reads its list from a resource folder of its own (or from the source tree's).
-class GeneralMidiTest : public ::testing::Test {
+class GeneralMidiTest : public SharedFolderTest {
 protected:
     void SetUp() override {
-        savedPaths = paths;
+        SharedFolderTest::SetUp();
         paths.resourcePath = folder.path();
         fs::create_directories(folder.file("Resources"));
         resetGeneralMidiTable();
-        clearUiCalls();
-        clearFileFailures();
     }
     void TearDown() override {
-        clearFileFailures();
         resetGeneralMidiTable();
-        paths = savedPaths;
+        SharedFolderTest::TearDown();
     }
     void writeList(const std::string& text) { writeFileText(listPath(), text); }
     std::string listPath() const { return folder.file("Resources/General MIDI.txt"); }
-    // The source tree this file belongs to holds the shipped Resources/.
-    void useShippedList() {
-        paths.resourcePath = fs::path(__FILE__).parent_path().parent_path().parent_path().string() + "/";
+    void useShippedList() { paths.resourcePath = sourceRoot(); }
+    // Each name gives its program and transposition.
+    void expectPrograms(const std::vector<std::tuple<const char*, int, int>>& cases) {
+        for (auto [name, program, transposition] : cases) {
+            int transpose = 99;
+            EXPECT_EQ(generalMidiProgram(name, &transpose), program) << name;
+            EXPECT_EQ(transpose, transposition) << name;
+        }
     }
-    TempFolder folder;
-    Paths savedPaths;
 };
 
 // ---- the shipped list ----
@@ -75,30 +76,12 @@ TEST_F(GeneralMidiShippedList, EveryProgramHasItsOwnFirstNameAndEveryLineReads) 
 
 TEST_F(GeneralMidiShippedList, CommonInstrumentNamesFindTheirPrograms) {
     useShippedList();
-    int transpose = 99;
-    EXPECT_EQ(generalMidiProgram("Voice", &transpose), 54);   // the default instrument: voice 53
-    EXPECT_EQ(transpose, 0);
-    EXPECT_EQ(generalMidiProgram("Piano"), 1);
-    EXPECT_EQ(generalMidiProgram("Grand piano"), 1);
-    EXPECT_EQ(generalMidiProgram("Choir"), 53);
-    EXPECT_EQ(generalMidiProgram("Whistling"), 79);
-    EXPECT_EQ(generalMidiProgram("Celesta"), 9);
-    EXPECT_EQ(generalMidiProgram("Vibraphone"), 12);
-    EXPECT_EQ(generalMidiProgram("Violin"), 41);
-    EXPECT_EQ(generalMidiProgram("Flute"), 74);
-    EXPECT_EQ(generalMidiProgram("Alto flute"), 74);
-    EXPECT_EQ(generalMidiProgram("Bassoon"), 71);
-    EXPECT_EQ(generalMidiProgram("Tenor saxophone"), 67);
-    EXPECT_EQ(generalMidiProgram("Tenor"), 54);
-    EXPECT_EQ(generalMidiProgram("Soprano recorder"), 75);
-    // Guitars and basses are the programs 25 to 40 that definitions synthesise.
-    int program = generalMidiProgram("Bass guitar", &transpose);
-    EXPECT_GE(program, 25);
-    EXPECT_LE(program, 40);
-    EXPECT_EQ(transpose, -12);
-    EXPECT_EQ(generalMidiProgram("Guitar", &transpose), 25);
-    EXPECT_EQ(transpose, -12);
-    EXPECT_EQ(generalMidiProgram("Kazoo"), 1);
+    // Voice 53 is the default instrument's; guitars and basses (25 to 40) are synthesised.
+    expectPrograms({{"Voice", 54, 0},       {"Piano", 1, 0},          {"Grand piano", 1, 0},   {"Choir", 53, 0},
+                    {"Whistling", 79, 0},   {"Celesta", 9, 0},        {"Vibraphone", 12, 0},   {"Violin", 41, 0},
+                    {"Flute", 74, 0},       {"Alto flute", 74, 0},    {"Bassoon", 71, 0},      {"Tenor", 54, 0},
+                    {"Tenor saxophone", 67, 0}, {"Soprano recorder", 75, 0}, {"Bass guitar", 34, -12},
+                    {"Guitar", 25, -12},    {"Kazoo", 1, 0}});
 }
 
 // ---- the lookup rules ----
@@ -119,85 +102,65 @@ static const char* const RULES_LIST =
 
 using GeneralMidiProgram = GeneralMidiTest;
 
-TEST_F(GeneralMidiProgram, AnEqualNameEndsTheSearchWhateverItsCase) {
+// An equal name ends the search whatever its case; otherwise the longest name at the start of a
+// word wins (a word may run on after it, but a name inside a word does not match), on a tie
+// the name earlier in the list; no match or an empty name gives the first program untransposed.
+TEST_F(GeneralMidiProgram, NamesFindTheirProgramsByTheLookupRules) {
     writeList(RULES_LIST);
-    int transpose = 0;
-    EXPECT_EQ(generalMidiProgram("bass GUITAR", &transpose), 34);
-    EXPECT_EQ(transpose, -7);
-    EXPECT_EQ(generalMidiProgram("VOICE OOHS", &transpose), 54);
-    EXPECT_EQ(transpose, 0);
-    // "Tenor" equals a name, so the longer "Tenor Sax" starting at the same word never counts.
-    EXPECT_EQ(generalMidiProgram("tenor", &transpose), 99);
-}
-
-TEST_F(GeneralMidiProgram, OtherwiseTheLongestNameAtTheStartOfAWordWins) {
-    writeList(RULES_LIST);
-    int transpose = 0;
-    EXPECT_EQ(generalMidiProgram("tenor sax solo", &transpose), 67);
-    EXPECT_EQ(transpose, 2);
-    EXPECT_EQ(generalMidiProgram("Bassoon in F"), 71);       // "Bassoon" beats "Bass"
-    EXPECT_EQ(generalMidiProgram("Pan Flutes"), 76);         // a name may run on into the next word
-    EXPECT_EQ(generalMidiProgram("Old (electric) bass", &transpose), 33);
-    EXPECT_EQ(transpose, -12);
-    EXPECT_EQ(generalMidiProgram("my-bass"), 33);            // the word starts after the hyphen
-    EXPECT_EQ(generalMidiProgram("Guitar2"), 25);            // digits belong to the word
-}
-
-TEST_F(GeneralMidiProgram, ANameInsideAWordDoesNotMatch) {
-    writeList(RULES_LIST);
-    EXPECT_EQ(generalMidiProgram("Subbass"), 1);
-    EXPECT_EQ(generalMidiProgram("2Guitar"), 1);
-    EXPECT_EQ(generalMidiProgram("Saxophone"), 66);          // but a word may go on after the name
-}
-
-TEST_F(GeneralMidiProgram, OnATieTheNameEarlierInTheListWins) {
-    writeList(RULES_LIST);
-    // "Flute" and "Piano" are both five letters; "Piano" comes first in the list.
-    EXPECT_EQ(generalMidiProgram("Flute and piano"), 1);
-    EXPECT_EQ(generalMidiProgram("Piano and flute"), 1);
-}
-
-TEST_F(GeneralMidiProgram, NoMatchOrAnEmptyNameGivesTheFirstProgramWithoutTransposition) {
-    writeList(RULES_LIST);
-    int transpose = 5;
-    EXPECT_EQ(generalMidiProgram("Kazoo", &transpose), 1);
-    EXPECT_EQ(transpose, 0);
-    transpose = 5;
-    EXPECT_EQ(generalMidiProgram("", &transpose), 1);
-    EXPECT_EQ(transpose, 0);
+    expectPrograms({{"bass GUITAR", 34, -7},
+                    {"VOICE OOHS", 54, 0},
+                    {"tenor", 99, 0},   // equals a name, so the longer "Tenor Sax" at the same word never counts
+                    {"tenor sax solo", 67, 2},
+                    {"Bassoon in F", 71, 0},   // "Bassoon" beats "Bass"
+                    {"Pan Flutes", 76, 0},     // a name may run on into the next word
+                    {"Old (electric) bass", 33, -12},
+                    {"my-bass", 33, -12},      // the word starts after the hyphen
+                    {"Guitar2", 25, -12},      // digits belong to the word
+                    {"Subbass", 1, 0},
+                    {"2Guitar", 1, 0},
+                    {"Saxophone", 66, 0},
+                    {"Flute and piano", 1, 0},   // "Flute" and "Piano" are both five letters; "Piano" comes first
+                    {"Piano and flute", 1, 0},
+                    {"Kazoo", 1, 0},
+                    {"", 1, 0}});
     EXPECT_EQ(generalMidiProgram("Guitar", nullptr, 3), 25);   // the track changes nothing
     EXPECT_EQ(messageCount(), 0);
 }
 
 using GeneralMidiNames = GeneralMidiTest;
 
-TEST_F(GeneralMidiNames, TheFirstNameOfTheFirstLineForTheProgramIsGiven) {
+TEST_F(GeneralMidiNames, TheFirstNameOfTheFirstLineForTheProgramIsGivenAndUnlistedNumbersAreUnknown) {
     writeList(RULES_LIST);
-    EXPECT_EQ(generalMidiName(54), "Voice");
-    EXPECT_EQ(generalMidiName(25), "Guitar");
-    EXPECT_EQ(generalMidiName(1), "Piano");
-}
-
-TEST_F(GeneralMidiNames, NumbersOutsideTheListAreUnknown) {
-    writeList(RULES_LIST);
-    EXPECT_EQ(generalMidiName(0), "Unknown");
-    EXPECT_EQ(generalMidiName(-3), "Unknown");
-    EXPECT_EQ(generalMidiName(129), "Unknown");
-    EXPECT_EQ(generalMidiName(2), "Unknown");   // not listed
+    const std::pair<int, const char*> cases[] = {{54, "Voice"},     {25, "Guitar"},   {1, "Piano"},      {0, "Unknown"},
+                                                 {-3, "Unknown"},   {129, "Unknown"}, {2, "Unknown"}};
+    for (auto [program, name] : cases) EXPECT_EQ(generalMidiName(program), name) << program;
 }
 
 // ---- lists that cannot be used as they are ----
 
 using GeneralMidiFile = GeneralMidiTest;
 
-TEST_F(GeneralMidiFile, AMissingListIsReportedOnceAndEveryNameGetsTheFirstProgram) {
-    EXPECT_EQ(generalMidiProgram("Flute"), 1);
-    EXPECT_EQ(generalMidiName(74), "Unknown");
-    EXPECT_EQ(generalMidiProgram("Voice"), 1);
-    EXPECT_EQ(messageCount(), 1);
-    EXPECT_EQ(lastMessageText(), "The General MIDI instrument list '" + listPath() +
-                                     "' could not be read, so instrument names cannot be matched to General MIDI "
-                                     "programs.");
+// A missing list, one larger than a megabyte, or one whose read fails is reported once, and
+// every name gets the first program.
+TEST_F(GeneralMidiFile, AListThatCannotBeReadIsReportedOnceAndEveryNameGetsTheFirstProgram) {
+    std::string large = "74 \"Flute\"\n";
+    large.resize(size_t(MAX_GENERAL_MIDI_FILE_BYTES) + 1, '\n');
+    for (int variant = 0; variant < 3; variant++) {
+        resetGeneralMidiTable();
+        clearUiCalls();
+        if (variant == 1) writeList(large);
+        if (variant == 2) {
+            writeList(RULES_LIST);
+            failFileCall(FILE_OP_READ, 1);
+        }
+        EXPECT_EQ((std::vector<std::string>{std::to_string(generalMidiProgram("Flute")), generalMidiName(74),
+                                            std::to_string(generalMidiProgram("Voice"))}),
+                  (std::vector<std::string>{"1", "Unknown", "1"}));
+        EXPECT_EQ(messageCount(), 1);
+        EXPECT_EQ(lastMessageText(), "The General MIDI instrument list '" + listPath() +
+                                         "' could not be read, so instrument names cannot be matched to General MIDI "
+                                         "programs.");
+    }
 }
 
 TEST_F(GeneralMidiFile, UnreadableLinesAreLeftOutAndTheFirstIsNamed) {
@@ -206,9 +169,8 @@ TEST_F(GeneralMidiFile, UnreadableLinesAreLeftOutAndTheFirstIsNamed) {
               "\n"
               "200 \"Tuba\"\n"
               "41 \"Violin\"\n");
-    EXPECT_EQ(generalMidiProgram("Violin"), 41);
-    EXPECT_EQ(generalMidiProgram("Flute"), 74);
-    EXPECT_EQ(generalMidiProgram("Tuba"), 1);
+    EXPECT_EQ((std::vector<int>{generalMidiProgram("Violin"), generalMidiProgram("Flute"), generalMidiProgram("Tuba")}),
+              (std::vector<int>{41, 74, 1}));
     EXPECT_EQ(messageCount(), 1);
     EXPECT_EQ(lastMessageText(), "Line 2 of the General MIDI instrument list '" + listPath() +
                                      "' cannot be read; it and any other unreadable lines have been ignored.");
@@ -221,22 +183,6 @@ TEST_F(GeneralMidiFile, WindowsLineEndsAByteOrderMarkAndBlankLinesAreFine) {
     EXPECT_EQ(generalMidiProgram("flute", &transpose), 74);
     EXPECT_EQ(transpose, 12);
     EXPECT_EQ(messageCount(), 0) << lastMessageText();
-}
-
-TEST_F(GeneralMidiFile, AListLargerThanAMegabyteIsNotRead) {
-    std::string text = "74 \"Flute\"\n";
-    text.resize(size_t(MAX_GENERAL_MIDI_FILE_BYTES) + 1, '\n');
-    writeList(text);
-    EXPECT_EQ(generalMidiProgram("Flute"), 1);
-    EXPECT_EQ(messageCount(), 1);
-    EXPECT_NE(lastMessageText().find("could not be read"), std::string::npos);
-}
-
-TEST_F(GeneralMidiFile, AReadThatFailsIsReportedLikeAMissingList) {
-    writeList(RULES_LIST);
-    failFileCall(FILE_OP_READ, 1);
-    EXPECT_EQ(generalMidiProgram("Flute"), 1);
-    EXPECT_NE(lastMessageText().find("could not be read"), std::string::npos);
 }
 
 TEST_F(GeneralMidiFile, AnotherResourceFolderIsReadAfresh) {
@@ -260,16 +206,10 @@ TEST_F(GeneralMidiLine, LinesInTheFormatGiveTheirNamesAndTranspositions) {
     EXPECT_EQ(parseGeneralMidiLine("25 \"Guitar\":-12 \"Nylon (soft)\":+5", names), GENERAL_MIDI_LINE_READ);
     EXPECT_EQ(parseGeneralMidiLine("0007 \"A\"\"B\":-0", names), GENERAL_MIDI_LINE_READ);
     ASSERT_EQ(names.size(), 6u);
-    EXPECT_EQ(names[0].program, 12);
-    EXPECT_EQ(names[0].name, "Vibraphone");
-    EXPECT_EQ(names[1].name, "Piano");
-    EXPECT_EQ(names[2].transpose, -12);
-    EXPECT_EQ(names[3].name, "Nylon (soft)");
-    EXPECT_EQ(names[3].transpose, 5);
-    EXPECT_EQ(names[4].program, 7);
-    EXPECT_EQ(names[4].name, "A");
-    EXPECT_EQ(names[5].name, "B");
-    EXPECT_EQ(names[5].transpose, 0);
+    std::vector<std::tuple<int, std::string, int>> read;   // program, name, transposition
+    for (const GeneralMidiName& n : names) read.emplace_back(n.program, n.name, n.transpose);
+    EXPECT_EQ(read, (std::vector<std::tuple<int, std::string, int>>{
+                        {12, "Vibraphone", 0}, {1, "Piano", 0}, {25, "Guitar", -12}, {25, "Nylon (soft)", 5}, {7, "A", 0}, {7, "B", 0}}));
     EXPECT_EQ(parseGeneralMidiLine("", names), GENERAL_MIDI_LINE_BLANK);
     EXPECT_EQ(parseGeneralMidiLine(" \t\r", names), GENERAL_MIDI_LINE_BLANK);
     EXPECT_EQ(names.size(), 6u);

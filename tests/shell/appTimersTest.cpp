@@ -2,6 +2,8 @@
 // message, replacing equal entries, releasing, and which entries a due timer calls back.
 #include <gtest/gtest.h>
 
+#include <tuple>
+#include <utility>
 #include <vector>
 
 #include "frameFixtures.h"
@@ -33,7 +35,7 @@ protected:
 
 }  // namespace
 
-TEST_F(AppTimersRegistry, ClaimsTakeIdsFromOneUpwardsAndReleasesCloseTheGap) {
+TEST_F(AppTimersRegistry, ClaimsTakeIdsFromOneUpwardsReleasesCloseTheGapAndAnEqualClaimReplaces) {
     ASSERT_EQ(claimEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 1, recordA), 1);
     ASSERT_EQ(claimEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 2, recordA), 1);
     ASSERT_EQ(claimEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 3, recordA), 1);
@@ -41,16 +43,12 @@ TEST_F(AppTimersRegistry, ClaimsTakeIdsFromOneUpwardsAndReleasesCloseTheGap) {
     EXPECT_EQ(releaseEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 2, recordA), 1);
     EXPECT_EQ(ids(), std::vector<int>({1, 3}));
     EXPECT_EQ(appTimers.events[1].key, 3);
-    EXPECT_EQ(releaseEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 2, recordA), 0);
-    EXPECT_EQ(releaseEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 3, recordB), 0);
-}
-
-TEST_F(AppTimersRegistry, ClaimingAnEqualEntryReplacesItWithANewId) {
-    claimEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 7, recordA);
-    claimEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 8, recordA);
-    ASSERT_EQ(claimEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 7, recordA), 1);
-    EXPECT_EQ(ids(), std::vector<int>({2, 3}));
-    EXPECT_EQ(appTimers.events[1].key, 7);
+    EXPECT_EQ(std::pair(releaseEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 2, recordA),
+                        releaseEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 3, recordB)), std::pair(0, 0));
+    // Claiming an equal entry replaces it with a new id.
+    ASSERT_EQ(claimEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 1, recordA), 1);
+    EXPECT_EQ(ids(), std::vector<int>({3, 4}));
+    EXPECT_EQ(appTimers.events[1].key, 1);
 }
 
 TEST_F(AppTimersRegistry, The129thClaimIsRefusedWithTheMessage) {
@@ -58,9 +56,8 @@ TEST_F(AppTimersRegistry, The129thClaimIsRefusedWithTheMessage) {
         ASSERT_EQ(claimEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, key, recordA), 1) << key;
     EXPECT_EQ(messageCount(), 0);
     EXPECT_EQ(claimEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 500, recordA), 0);
-    EXPECT_EQ(lastMessageText(), "Maximum number of claimed events has been reached!");
-    EXPECT_EQ(uiCalls().back().kind, MESSAGE_ERROR);
-    EXPECT_EQ(appTimers.count, MAX_CLAIMED_EVENTS);
+    EXPECT_EQ(std::tuple(lastMessageText(), uiCalls().back().kind, appTimers.count),
+              std::tuple("Maximum number of claimed events has been reached!", MESSAGE_ERROR, MAX_CLAIMED_EVENTS));
     // An entry already held is replaced even in a full table.
     clearUiCalls();
     EXPECT_EQ(claimEvent(EVENT_WINDOW_TIMER, SONG_VIEW_WINDOW, 5, recordA), 1);

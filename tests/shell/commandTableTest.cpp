@@ -5,6 +5,7 @@
 #include <map>
 #include <set>
 #include <string>
+#include <tuple>
 
 #include "shell/commandTable.h"
 
@@ -86,12 +87,9 @@ TEST(CommandTable, TheEditItemsCarryTheSongViewsCodes) {
 }
 
 TEST(CommandTable, LabelAndKeyAreSplitAtTheTab) {
-    EXPECT_EQ(commandLabel(CMD_OPEN), "&Open...");
-    EXPECT_EQ(commandKeyText(CMD_OPEN), "Ctrl+O");
-    EXPECT_EQ(commandLabel(CMD_ZOOM_IN), "Zoom &In");
-    EXPECT_EQ(commandKeyText(CMD_ZOOM_IN), "Ctrl+NUM+");
-    EXPECT_EQ(commandLabel(CMD_CLOSE), "&Close");
-    EXPECT_EQ(commandKeyText(CMD_CLOSE), "");
+    const std::tuple<int, const char*, const char*> cases[] = {
+        {CMD_OPEN, "&Open...", "Ctrl+O"}, {CMD_ZOOM_IN, "Zoom &In", "Ctrl+NUM+"}, {CMD_CLOSE, "&Close", ""}};
+    for (auto [id, label, key] : cases) EXPECT_EQ(std::pair(commandLabel(id), commandKeyText(id)), std::pair(std::string(label), std::string(key)));
     EXPECT_EQ(commandLabel(CMD_SCANNING_CTRL_P), "");
 }
 
@@ -122,10 +120,8 @@ TEST(CommandTable, TheMenuBarHoldsEveryCommandOnceInBalancedPopups) {
     EXPECT_TRUE(stack.empty());
     for (int i = 0; i < commandTableCount; i++) EXPECT_EQ(seen.count(commandTable[i].id), 1u) << commandTable[i].id;
     EXPECT_EQ(int(seen.size()), commandTableCount);
-    EXPECT_EQ(parentOf[POPUP_PITCH], POPUP_NOTES);
-    EXPECT_EQ(parentOf[POPUP_TIMING], POPUP_NOTES);
-    EXPECT_EQ(parentOf[POPUP_VOLUME], POPUP_NOTES);
-    EXPECT_EQ(parentOf[POPUP_MODE], POPUP_PLAY);
+    EXPECT_EQ(std::tuple(parentOf[POPUP_PITCH], parentOf[POPUP_TIMING], parentOf[POPUP_VOLUME], parentOf[POPUP_MODE]),
+              std::tuple(POPUP_NOTES, POPUP_NOTES, POPUP_NOTES, POPUP_PLAY));
 }
 
 TEST(CommandTable, AcceleratorTable130SendsTheseCommands) {

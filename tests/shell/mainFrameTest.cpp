@@ -2,6 +2,8 @@
 // placement, the modes taken from the settings, and the song's window opening and closing.
 #include <gtest/gtest.h>
 
+#include <tuple>
+
 #include "frameFixtures.h"
 
 class CommandTableFrame : public FrameTest {};
@@ -38,11 +40,7 @@ TEST_F(CommandTableFrame, APlacementIsStoredAsTheElevenFieldRecordAndReadBack) {
     EXPECT_EQ(b[40] | b[41] << 8, 818);       // bottom
     WindowPlacement p{};
     ASSERT_EQ(readMainWindowPlacement(&p), 1);
-    EXPECT_EQ(p.showState, SHOW_NORMAL);
-    EXPECT_EQ(p.left, 100);
-    EXPECT_EQ(p.top, 50);
-    EXPECT_EQ(p.right, 1124);
-    EXPECT_EQ(p.bottom, 818);
+    EXPECT_EQ(std::tuple(p.showState, p.left, p.top, p.right, p.bottom), std::tuple(SHOW_NORMAL, 100, 50, 1124, 818));
 }
 
 TEST_F(CommandTableFrame, AShowStateOtherThanNormalOrMaximizedOpensMaximized) {

@@ -67,140 +67,83 @@ TEST(MenuEnabling, AnEmptySongGreysEveryNoteEditAndTimingItemAndSelectAll) {
     for (int id : {CMD_SAVE, CMD_CLOSE, CMD_ZOOM_IN, CMD_PLAY_STOP}) EXPECT_EQ(commandEnabled(id, s), 1) << id;
 }
 
-TEST(MenuEnabling, CutCopyAndDeleteNeedAudioASelectionAndQuiet) {
-    const std::vector<int> items = {CMD_CUT, CMD_COPY, CMD_DELETE};
-    MenuState s = songWithOneSelectedNote();
-    EXPECT_EQ(enabledOf(items, s), std::vector<int>({1, 1, 1}));
-    MenuState timeOnly = s;
-    timeOnly.selectedNoteCount = 0;
-    timeOnly.timeSelection = true;
-    EXPECT_EQ(enabledOf(items, timeOnly), std::vector<int>({1, 1, 1}));
-    MenuState none = s;
-    none.selectedNoteCount = 0;
-    EXPECT_EQ(enabledOf(items, none), std::vector<int>({0, 0, 0}));
-    MenuState noAudio = s;
-    noAudio.audio = false;
-    EXPECT_EQ(enabledOf(items, noAudio), std::vector<int>({0, 0, 0}));
-    MenuState busy = s;
-    busy.busy = true;
-    EXPECT_EQ(enabledOf(items, busy), std::vector<int>({0, 0, 0}));
-}
-
-TEST(MenuEnabling, SelectAllNeedsAudioOnlyAndDeselectAllASelectionToo) {
-    MenuState s = songWithOneSelectedNote();
-    s.busy = true;
-    EXPECT_EQ(commandEnabled(CMD_SELECT_ALL, s), 1);
-    EXPECT_EQ(commandEnabled(CMD_DESELECT_ALL, s), 1);
-    s.selectedNoteCount = 0;
-    EXPECT_EQ(commandEnabled(CMD_SELECT_ALL, s), 1);
-    EXPECT_EQ(commandEnabled(CMD_DESELECT_ALL, s), 0);
-    s.timeSelection = true;
-    EXPECT_EQ(commandEnabled(CMD_DESELECT_ALL, s), 1);
-    s.audio = false;
-    EXPECT_EQ(commandEnabled(CMD_SELECT_ALL, s), 0);
-    EXPECT_EQ(commandEnabled(CMD_DESELECT_ALL, s), 0);
-}
-
-TEST(MenuEnabling, PasteNeedsAudioTheClipboardAndQuiet) {
-    MenuState s = songWithOneSelectedNote();
-    s.selectedNoteCount = 0;
-    EXPECT_EQ(commandEnabled(CMD_PASTE, s), 0);
-    s.clipboardHoldsData = true;
-    EXPECT_EQ(commandEnabled(CMD_PASTE, s), 1);
-    s.busy = true;
-    EXPECT_EQ(commandEnabled(CMD_PASTE, s), 0);
-    s.busy = false;
-    s.audio = false;
-    EXPECT_EQ(commandEnabled(CMD_PASTE, s), 0);
-}
-
-TEST(MenuEnabling, UndoAndRedoFollowTheirStepsAndAreGreyWhileBusy) {
-    MenuState s = songWithOneSelectedNote();
-    EXPECT_EQ(enabledOf({CMD_UNDO, CMD_REDO}, s), std::vector<int>({0, 0}));
-    s.canUndo = true;
-    EXPECT_EQ(enabledOf({CMD_UNDO, CMD_REDO}, s), std::vector<int>({1, 0}));
-    s.canRedo = true;
-    s.canUndo = false;
-    EXPECT_EQ(enabledOf({CMD_UNDO, CMD_REDO}, s), std::vector<int>({0, 1}));
-    s.canUndo = true;
-    s.busy = true;
-    EXPECT_EQ(enabledOf({CMD_UNDO, CMD_REDO}, s), std::vector<int>({0, 0}));
-}
-
-TEST(MenuEnabling, SplitNoteWantsExactlyOneSelectedNoteAndRoomForAnother) {
-    MenuState s = songWithOneSelectedNote();
-    EXPECT_EQ(commandEnabled(CMD_SPLIT_NOTE, s), 1);
-    s.selectedNoteCount = 2;
-    EXPECT_EQ(commandEnabled(CMD_SPLIT_NOTE, s), 0);
-    s.selectedNoteCount = 1;
-    s.noteCount = 16383;
-    EXPECT_EQ(commandEnabled(CMD_SPLIT_NOTE, s), 1);
-    s.noteCount = 16384;
-    EXPECT_EQ(commandEnabled(CMD_SPLIT_NOTE, s), 0);
-    s.noteCount = 5;
-    s.busy = true;
-    EXPECT_EQ(commandEnabled(CMD_SPLIT_NOTE, s), 0);
-}
-
-TEST(MenuEnabling, JoinNotesFollowsWhetherTheSelectionCanBeJoined) {
-    MenuState s = songWithOneSelectedNote();
-    EXPECT_EQ(commandEnabled(CMD_JOIN_NOTES, s), 0);
-    s.joinable = true;
-    s.selectedNoteCount = 2;
-    EXPECT_EQ(commandEnabled(CMD_JOIN_NOTES, s), 1);
-    s.busy = true;
-    EXPECT_EQ(commandEnabled(CMD_JOIN_NOTES, s), 0);
-}
-
-TEST(MenuEnabling, PitchAndVolumeItemsNeedASelectedNoteAndQuiet) {
-    MenuState s = songWithOneSelectedNote();
-    EXPECT_EQ(enabledOf(SELECTED_NOTE_ITEMS, s), std::vector<int>(SELECTED_NOTE_ITEMS.size(), 1));
-    MenuState timeOnly = s;
-    timeOnly.selectedNoteCount = 0;
-    timeOnly.timeSelection = true;
-    EXPECT_EQ(enabledOf(SELECTED_NOTE_ITEMS, timeOnly), std::vector<int>(SELECTED_NOTE_ITEMS.size(), 0));
-    MenuState busy = s;
-    busy.busy = true;
-    EXPECT_EQ(enabledOf(SELECTED_NOTE_ITEMS, busy), std::vector<int>(SELECTED_NOTE_ITEMS.size(), 0));
-}
-
-TEST(MenuEnabling, InNoteModeFlattenVibratoAndTheSlidesAreGreyWhileQuantizeStays) {
-    MenuState s = songWithOneSelectedNote();
-    EXPECT_EQ(enabledOf(DETAIL_ITEMS, s), std::vector<int>(DETAIL_ITEMS.size(), 1));
-    s.noteMode = NOTE_MODE_NOTE;
-    EXPECT_EQ(enabledOf(DETAIL_ITEMS, s), std::vector<int>(DETAIL_ITEMS.size(), 0));
-    EXPECT_EQ(commandEnabled(CMD_QUANTIZE, s), 1);
-    EXPECT_EQ(commandEnabled(POPUP_PITCH, s), 1);
-    s.noteMode = NOTE_MODE_DETAIL;
-    s.busy = true;
-    EXPECT_EQ(enabledOf(DETAIL_ITEMS, s), std::vector<int>(DETAIL_ITEMS.size(), 0));
-}
-
-TEST(MenuEnabling, InMidiModeTheTimingItemsAreGreyAndTheSetToItemsEnabledInWaveModeTheReverse) {
-    MenuState s = songWithOneSelectedNote();
-    s.playbackMode = PLAYBACK_MODE_MIDI;
-    EXPECT_EQ(enabledOf(TIMING_ITEMS, s), std::vector<int>(TIMING_ITEMS.size(), 0));
-    EXPECT_EQ(enabledOf(SET_VOLUME_ITEMS, s), std::vector<int>(SET_VOLUME_ITEMS.size(), 1));
-    s.playbackMode = PLAYBACK_MODE_WAVE;
-    EXPECT_EQ(enabledOf(TIMING_ITEMS, s), std::vector<int>(TIMING_ITEMS.size(), 1));
-    EXPECT_EQ(enabledOf(SET_VOLUME_ITEMS, s), std::vector<int>(SET_VOLUME_ITEMS.size(), 0));
-    s.selectedNoteCount = 0;
-    EXPECT_EQ(enabledOf(TIMING_ITEMS, s), std::vector<int>(TIMING_ITEMS.size(), 0));
-    s.selectedNoteCount = 1;
-    s.playbackMode = PLAYBACK_MODE_MIDI;
-    s.busy = true;
-    EXPECT_EQ(enabledOf(SET_VOLUME_ITEMS, s), std::vector<int>(SET_VOLUME_ITEMS.size(), 0));
-}
-
-TEST(MenuEnabling, StripEndsNeedsANoteButNoSelection) {
-    MenuState s = songWithOneSelectedNote();
-    s.selectedNoteCount = 0;
-    EXPECT_EQ(commandEnabled(CMD_STRIP_ENDS, s), 1);
-    s.busy = true;
-    EXPECT_EQ(commandEnabled(CMD_STRIP_ENDS, s), 0);
-    s.busy = false;
-    s.noteCount = 0;
-    EXPECT_EQ(commandEnabled(CMD_STRIP_ENDS, s), 0);
+// Each row: the items, a change to a song with audio, five notes, one of them selected, Wave
+// and Detail mode and nothing running, and whether the items are then enabled.
+TEST(MenuEnabling, EachItemFollowsItsRule) {
+    using Change = void (*)(MenuState&);
+    const std::vector<int> CUT_COPY_DELETE = {CMD_CUT, CMD_COPY, CMD_DELETE};
+    const std::vector<int> UNDO = {CMD_UNDO}, REDO = {CMD_REDO}, PASTE = {CMD_PASTE}, SELECT_ALL = {CMD_SELECT_ALL};
+    const std::vector<int> DESELECT_ALL = {CMD_DESELECT_ALL}, SPLIT = {CMD_SPLIT_NOTE}, JOIN = {CMD_JOIN_NOTES};
+    const std::vector<int> STRIP = {CMD_STRIP_ENDS}, QUANTIZE = {CMD_QUANTIZE, POPUP_PITCH};
+    struct Row {
+        const std::vector<int>& items;
+        Change change;
+        int enabled;
+    } rows[] = {
+        // cut, copy and delete need audio, a selection and quiet
+        {CUT_COPY_DELETE, [](MenuState&) {}, 1},
+        {CUT_COPY_DELETE, [](MenuState& s) { s.selectedNoteCount = 0, s.timeSelection = true; }, 1},
+        {CUT_COPY_DELETE, [](MenuState& s) { s.selectedNoteCount = 0; }, 0},
+        {CUT_COPY_DELETE, [](MenuState& s) { s.audio = false; }, 0},
+        {CUT_COPY_DELETE, [](MenuState& s) { s.busy = true; }, 0},
+        // select all needs audio only, deselect all a selection too
+        {SELECT_ALL, [](MenuState& s) { s.busy = true, s.selectedNoteCount = 0; }, 1},
+        {DESELECT_ALL, [](MenuState& s) { s.busy = true; }, 1},
+        {DESELECT_ALL, [](MenuState& s) { s.selectedNoteCount = 0; }, 0},
+        {DESELECT_ALL, [](MenuState& s) { s.selectedNoteCount = 0, s.timeSelection = true; }, 1},
+        {SELECT_ALL, [](MenuState& s) { s.audio = false; }, 0},
+        {DESELECT_ALL, [](MenuState& s) { s.audio = false, s.timeSelection = true; }, 0},
+        // paste needs audio, the clipboard and quiet
+        {PASTE, [](MenuState& s) { s.selectedNoteCount = 0; }, 0},
+        {PASTE, [](MenuState& s) { s.clipboardHoldsData = true; }, 1},
+        {PASTE, [](MenuState& s) { s.clipboardHoldsData = true, s.busy = true; }, 0},
+        {PASTE, [](MenuState& s) { s.clipboardHoldsData = true, s.audio = false; }, 0},
+        // undo and redo follow their steps and are grey while busy
+        {UNDO, [](MenuState&) {}, 0},
+        {REDO, [](MenuState&) {}, 0},
+        {UNDO, [](MenuState& s) { s.canUndo = true; }, 1},
+        {REDO, [](MenuState& s) { s.canUndo = true; }, 0},
+        {REDO, [](MenuState& s) { s.canRedo = true; }, 1},
+        {UNDO, [](MenuState& s) { s.canUndo = true, s.busy = true; }, 0},
+        {REDO, [](MenuState& s) { s.canRedo = true, s.busy = true; }, 0},
+        // split wants exactly one selected note and room for another
+        {SPLIT, [](MenuState&) {}, 1},
+        {SPLIT, [](MenuState& s) { s.selectedNoteCount = 2; }, 0},
+        {SPLIT, [](MenuState& s) { s.noteCount = 16383; }, 1},
+        {SPLIT, [](MenuState& s) { s.noteCount = 16384; }, 0},
+        {SPLIT, [](MenuState& s) { s.busy = true; }, 0},
+        // join follows whether the selection can be joined
+        {JOIN, [](MenuState&) {}, 0},
+        {JOIN, [](MenuState& s) { s.joinable = true, s.selectedNoteCount = 2; }, 1},
+        {JOIN, [](MenuState& s) { s.joinable = true, s.selectedNoteCount = 2, s.busy = true; }, 0},
+        // pitch and volume items need a selected note and quiet
+        {SELECTED_NOTE_ITEMS, [](MenuState&) {}, 1},
+        {SELECTED_NOTE_ITEMS, [](MenuState& s) { s.selectedNoteCount = 0, s.timeSelection = true; }, 0},
+        {SELECTED_NOTE_ITEMS, [](MenuState& s) { s.busy = true; }, 0},
+        // in Note mode flatten, vibrato and the slides are grey while quantize stays
+        {DETAIL_ITEMS, [](MenuState&) {}, 1},
+        {DETAIL_ITEMS, [](MenuState& s) { s.noteMode = NOTE_MODE_NOTE; }, 0},
+        {QUANTIZE, [](MenuState& s) { s.noteMode = NOTE_MODE_NOTE; }, 1},
+        {DETAIL_ITEMS, [](MenuState& s) { s.busy = true; }, 0},
+        // in MIDI mode the timing items are grey and the set-to items enabled; in Wave mode the reverse
+        {TIMING_ITEMS, [](MenuState& s) { s.playbackMode = PLAYBACK_MODE_MIDI; }, 0},
+        {SET_VOLUME_ITEMS, [](MenuState& s) { s.playbackMode = PLAYBACK_MODE_MIDI; }, 1},
+        {TIMING_ITEMS, [](MenuState&) {}, 1},
+        {SET_VOLUME_ITEMS, [](MenuState&) {}, 0},
+        {TIMING_ITEMS, [](MenuState& s) { s.selectedNoteCount = 0; }, 0},
+        {SET_VOLUME_ITEMS, [](MenuState& s) { s.playbackMode = PLAYBACK_MODE_MIDI, s.busy = true; }, 0},
+        // strip ends needs a note but no selection
+        {STRIP, [](MenuState& s) { s.selectedNoteCount = 0; }, 1},
+        {STRIP, [](MenuState& s) { s.selectedNoteCount = 0, s.busy = true; }, 0},
+        {STRIP, [](MenuState& s) { s.selectedNoteCount = 0, s.noteCount = 0; }, 0},
+    };
+    int row = 0;
+    for (const Row& r : rows) {
+        MenuState s = songWithOneSelectedNote();
+        r.change(s);
+        EXPECT_EQ(enabledOf(r.items, s), std::vector<int>(r.items.size(), r.enabled)) << "row " << row;
+        row++;
+    }
 }
 
 TEST(MenuEnabling, ModeItemsAreCheckedForTheCurrentModes) {

@@ -5,6 +5,7 @@
 
 #include <cstdlib>
 #include <filesystem>
+#include <tuple>
 
 #include "platform/registry.h"
 #include "platform/ui.h"
@@ -15,31 +16,12 @@
 
 namespace fs = std::filesystem;
 
-class PathsTest : public ::testing::Test {
+class PathsTest : public ConfigFolderTest {
 protected:
     void SetUp() override {
-        savedPaths = paths;
-        const char* old = std::getenv("MELODRIFT_CONFIG_DIR");
-        savedConfig = old ? old : "";
-        config = folder.file("config/");
-        setenv("MELODRIFT_CONFIG_DIR", config.c_str(), 1);
-        resetRegistry();
-        resetSettings();
-        clearUiCalls();
-        quitFlag = 0;
-        start = folder.file("start/");
+        ConfigFolderTest::SetUp();
         setInitialDirectory(start);
     }
-    void TearDown() override {
-        paths = savedPaths;
-        setenv("MELODRIFT_CONFIG_DIR", savedConfig.c_str(), 1);
-        resetRegistry();
-        resetSettings();
-        clearUiCalls();
-        quitFlag = 0;
-    }
-    std::string machineFile() const { return config + "machine.reg"; }
-    std::string userFile() const { return config + "user.reg"; }
     void writeRoot(const std::string& file, const std::string& dataPathValues) {
         fs::create_directories(config);
         writeFileText(file, "Melodrift Settings Version 1\n[SOFTWARE\\Torvellan\\Melodrift\\1.0\\DataPath]\n" +
@@ -49,11 +31,7 @@ protected:
         return ("\n" + text).find("\n" + line + "\n") != std::string::npos;
     }
 
-    TempFolder folder;
-    std::string config;
-    std::string savedConfig;
-    std::string start;   // the initial directory of these tests
-    Paths savedPaths;
+    std::string start = folder.file("start/");   // the initial directory of these tests
 };
 
 // ---- resolving the paths ----
@@ -72,10 +50,7 @@ TEST_F(PathsDataPath, TheFirstStartWritesTheInitialDirectoryAsBothPaths) {
               std::string::npos);
     EXPECT_FALSE(fs::exists(userFile()));
     EXPECT_EQ(messageCount(), 0);
-}
-
-TEST_F(PathsDataPath, AnExistingKeyKeepsItsPathsWhenStartedElsewhere) {
-    ASSERT_EQ(loadDataPaths(), 1);
+    // Started elsewhere, the existing key keeps its paths.
     setInitialDirectory(folder.file("elsewhere"));
     resetRegistry();
     ASSERT_EQ(loadDataPaths(), 1);
@@ -84,16 +59,15 @@ TEST_F(PathsDataPath, AnExistingKeyKeepsItsPathsWhenStartedElsewhere) {
     EXPECT_EQ(paths.sharedBasePath, start);
 }
 
-TEST_F(PathsDataPath, StoredPathsWithoutATrailingSlashAreUsedWithOne) {
+TEST_F(PathsDataPath, StoredPathsAreUsedWithATrailingSlashAndEmptyOrMissingOnesAreTheInitialDirectory) {
     writeRoot(machineFile(), "\"ResourcePath\"=\"/opt/melodrift\"\n\"TorvellanSharedPath\"=\"/var/data\"\n");
     ASSERT_EQ(loadDataPaths(), 1);
     EXPECT_EQ(paths.resourcePath, "/opt/melodrift/");
     EXPECT_EQ(paths.sharedBasePath, "/var/data/");
     EXPECT_EQ(paths.sharedFolder, "/var/data/Torvellan Shared/");
-}
 
-TEST_F(PathsDataPath, AnEmptyOrMissingPathIsSetToTheInitialDirectoryAndWrittenBack) {
     writeRoot(machineFile(), "\"ResourcePath\"=\"\"\n");
+    resetRegistry();
     ASSERT_EQ(loadDataPaths(), 1);
     EXPECT_EQ(paths.resourcePath, start);
     EXPECT_EQ(paths.sharedBasePath, start);
@@ -107,11 +81,8 @@ TEST_F(PathsDataPath, APathThatCannotBeReadIsReportedAndTheInitialDirectoryStays
     writeRoot(machineFile(), "\"ResourcePath\"=dword:00000001\n\"TorvellanSharedPath\"=\"/var/data/\"\n");
     std::string before = readFileText(machineFile());
     ASSERT_EQ(loadDataPaths(), 1);
-    EXPECT_EQ(messageCount(), 1);
-    EXPECT_EQ(lastMessageText(), "Can't read registry");
-    EXPECT_EQ(uiCalls().back().kind, MESSAGE_ERROR);
-    EXPECT_EQ(paths.resourcePath, start);
-    EXPECT_EQ(paths.sharedBasePath, "/var/data/");
+    EXPECT_EQ(std::tuple(messageCount(), lastMessageText(), uiCalls().back().kind), std::tuple(1, "Can't read registry", MESSAGE_ERROR));
+    EXPECT_EQ(std::tuple(paths.resourcePath, paths.sharedBasePath), std::tuple(start, "/var/data/"));
     EXPECT_EQ(readFileText(machineFile()), before);
 }
 
@@ -123,17 +94,15 @@ TEST_F(PathsDataPath, TheUsersSharedPathLeavesTheMachinesValueUnreadAndUnwritten
     std::string machineBefore = readFileText(machineFile());
     std::string userBefore = readFileText(userFile());
     ASSERT_EQ(loadDataPaths(), 1);
-    EXPECT_EQ(paths.sharedBasePath, "/home/singer/shared/");
-    EXPECT_EQ(paths.sharedFolder, "/home/singer/shared/Torvellan Shared/");
-    EXPECT_EQ(paths.resourcePath, "/opt/melodrift/");
+    EXPECT_EQ(std::tuple(paths.sharedBasePath, paths.sharedFolder, paths.resourcePath),
+              std::tuple("/home/singer/shared/", "/home/singer/shared/Torvellan Shared/", "/opt/melodrift/"));
     EXPECT_EQ(messageCount(), 0);
     EXPECT_EQ(readFileText(machineFile()), machineBefore);
     EXPECT_EQ(readFileText(userFile()), userBefore);
-}
-
-TEST_F(PathsDataPath, AnEmptyUserValueCountsAsNone) {
+    // An empty user value counts as none.
     writeRoot(userFile(), "\"TorvellanSharedPath\"=\"\"\n");
     writeRoot(machineFile(), "\"ResourcePath\"=\"/opt/melodrift/\"\n\"TorvellanSharedPath\"=\"/var/data/\"\n");
+    resetRegistry();
     ASSERT_EQ(loadDataPaths(), 1);
     EXPECT_EQ(paths.sharedBasePath, "/var/data/");
 }
@@ -141,11 +110,13 @@ TEST_F(PathsDataPath, AnEmptyUserValueCountsAsNone) {
 TEST_F(PathsDataPath, AKeyThatCannotBeCreatedIsReportedAndStopsStartUp) {
     writeFileText(folder.file("config"), "in the way");
     EXPECT_EQ(loadDataPaths(), 0);
+    EXPECT_EQ(std::tuple(lastMessageText(), messageCount(), quitFlag), std::tuple("Can't access registry properly", 1, 1u));
+    EXPECT_EQ(std::tuple(paths.resourcePath, paths.sharedBasePath), std::tuple(start, start));
+    // Saving the user's shared folder then fails too: reported, but no quitting.
+    quitFlag = 0;
+    EXPECT_EQ(saveSharedPath("/home/singer/takes"), 0);
     EXPECT_EQ(lastMessageText(), "Can't access registry properly");
-    EXPECT_EQ(messageCount(), 1);
-    EXPECT_EQ(quitFlag, 1u);
-    EXPECT_EQ(paths.resourcePath, start);
-    EXPECT_EQ(paths.sharedBasePath, start);
+    EXPECT_EQ(quitFlag, 0u);
 }
 
 // ---- the user's shared folder ----
@@ -165,23 +136,10 @@ TEST_F(PathsSharedFolder, ASharedPathWithoutATrailingSlashIsStoredWithOne) {
     ASSERT_EQ(loadDataPaths(), 1);
     EXPECT_EQ(paths.sharedBasePath, "/home/singer/other/");
     EXPECT_EQ(sharedFilePath("CS.fw"), "/home/singer/other/Torvellan Shared/CS.fw");
-}
 
-TEST_F(PathsSharedFolder, AnEmptySharedPathIsNotStored) {
-    ASSERT_EQ(saveSharedPath("/home/singer/takes/"), 1);
     std::string before = readFileText(userFile());
-    EXPECT_EQ(saveSharedPath(""), 0);
+    EXPECT_EQ(saveSharedPath(""), 0) << "an empty shared path is not stored";
     EXPECT_EQ(readFileText(userFile()), before);
-}
-
-TEST_F(PathsSharedFolder, AFailedSaveIsReportedButDoesNotQuit) {
-    writeFileText(folder.file("config"), "in the way");
-    EXPECT_EQ(saveSharedPath("/home/singer/takes"), 0);
-    EXPECT_EQ(lastMessageText(), "Can't access registry properly");
-    EXPECT_EQ(quitFlag, 0u);
-}
-
-TEST_F(PathsSharedFolder, TheSharedFolderIsBelowTheBasePath) {
     setSharedBasePath("/srv/music");
     EXPECT_EQ(paths.sharedBasePath, "/srv/music/");
     EXPECT_EQ(sharedFilePath("CSUndo/Undo3"), "/srv/music/Torvellan Shared/CSUndo/Undo3");
@@ -191,16 +149,10 @@ TEST_F(PathsSharedFolder, TheSharedFolderIsBelowTheBasePath) {
 
 using PathsResources = PathsTest;
 
-TEST_F(PathsResources, TheConfiguredResourceFolderIsUsedWhenItHoldsResources) {
-    fs::create_directories(start + "Resources");
-    EXPECT_EQ(resourceFilePath("CSInst.dat"), start + "Resources/CSInst.dat");
-}
-
-TEST_F(PathsResources, WithoutResourcesInTheConfiguredFolderTheSourceTreesAreFound) {
-    // This file is tests/shell/pathsTest.cpp in the source tree the program was built from.
-    fs::path sourceRoot = fs::path(__FILE__).parent_path().parent_path().parent_path();
-    if (!fs::is_directory(sourceRoot / "Resources")) GTEST_SKIP() << "the source tree holds no Resources folder";
+TEST_F(PathsResources, TheConfiguredResourceFolderIsUsedWhenItHoldsResourcesElseTheSourceTrees) {
     std::string found = resourceFilePath("CSInst.dat");
     EXPECT_NE(found, start + "Resources/CSInst.dat");
-    EXPECT_TRUE(fs::equivalent(fs::path(found).parent_path(), sourceRoot / "Resources")) << found;
+    EXPECT_TRUE(fs::equivalent(fs::path(found).parent_path(), sourceRoot() + "Resources")) << found;
+    fs::create_directories(start + "Resources");
+    EXPECT_EQ(resourceFilePath("CSInst.dat"), start + "Resources/CSInst.dat");
 }

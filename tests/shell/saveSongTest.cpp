@@ -4,6 +4,7 @@
 
 #include <string>
 #include <vector>
+#include <tuple>
 
 #include "audio/waveWorkingFile.h"
 #include "frameFixtures.h"
@@ -60,22 +61,11 @@ protected:
 
 }  // namespace
 
-TEST_F(CommandTableSave, TheOutputTypeFollowsThePlaybackAndNoteModes) {
-    EXPECT_EQ(currentOutputType(), OUTPUT_WAVE);
-    displayModes.noteMode = NOTE_MODE_NOTE;
-    EXPECT_EQ(currentOutputType(), OUTPUT_WAVE);
-    displayModes.playbackMode = PLAYBACK_MODE_MIDI;
-    EXPECT_EQ(currentOutputType(), OUTPUT_MIDI);
-    displayModes.noteMode = NOTE_MODE_DETAIL;
-    EXPECT_EQ(currentOutputType(), OUTPUT_DETAIL_MIDI);
-}
-
 TEST_F(CommandTableSave, ANewSongIsNamedAfterItsFileWithoutTheExtension) {
     setSongNamesFromFile("/songs/take 1.wav");
-    EXPECT_EQ(songNames.remembered[OUTPUT_WAVE], "/songs/take 1");
-    EXPECT_EQ(songNames.remembered[OUTPUT_MIDI], "/songs/take 1");
-    EXPECT_EQ(songNames.remembered[OUTPUT_DETAIL_MIDI], "/songs/take 1");
-    EXPECT_EQ(songNames.lastSaved[OUTPUT_WAVE], "");
+    const SongNames& n = songNames;
+    EXPECT_EQ(std::tuple(n.remembered[OUTPUT_WAVE], n.remembered[OUTPUT_MIDI], n.remembered[OUTPUT_DETAIL_MIDI], n.lastSaved[OUTPUT_WAVE]),
+              std::tuple("/songs/take 1", "/songs/take 1", "/songs/take 1", ""));
     setSongNamesFromFile("/songs/v1.2/take.mpeg");   // the dot is five characters from the end
     EXPECT_EQ(songNames.remembered[OUTPUT_WAVE], "/songs/v1.2/take.mpeg");
     setSongNamesFromFile("/songs/take.ab");
@@ -83,37 +73,40 @@ TEST_F(CommandTableSave, ANewSongIsNamedAfterItsFileWithoutTheExtension) {
 }
 
 TEST_F(CommandTableSave, TheDialogOffersTheOutputsFilterAndProposesItsName) {
+    const std::tuple<int, int, int> modes[] = {{NOTE_MODE_NOTE, PLAYBACK_MODE_WAVE, OUTPUT_WAVE},
+                                               {NOTE_MODE_NOTE, PLAYBACK_MODE_MIDI, OUTPUT_MIDI},
+                                               {NOTE_MODE_DETAIL, PLAYBACK_MODE_MIDI, OUTPUT_DETAIL_MIDI},
+                                               {NOTE_MODE_DETAIL, PLAYBACK_MODE_WAVE, OUTPUT_WAVE}};
+    for (auto [noteMode, playbackMode, output] : modes) {
+        displayModes.noteMode = noteMode;
+        displayModes.playbackMode = playbackMode;
+        EXPECT_EQ(currentOutputType(), output) << noteMode << " " << playbackMode;
+    }
     setSongNamesFromFile("/songs/take.wav");
     globalSettings.saveDirectory = "/exports";
     SaveDialogSetup wave = saveDialogSetup();
-    EXPECT_EQ(wave.filterName, "Wave audio files");
-    EXPECT_EQ(wave.pattern, "*.wav");
-    EXPECT_EQ(wave.proposedName, "/songs/take");
-    EXPECT_EQ(wave.directory, "/exports");
+    EXPECT_EQ(std::tuple(wave.filterName, wave.pattern, wave.proposedName, wave.directory),
+              std::tuple("Wave audio files", "*.wav", "/songs/take", "/exports"));
     displayModes.playbackMode = PLAYBACK_MODE_MIDI;
     songNames.remembered[OUTPUT_DETAIL_MIDI] = "/songs/take detail";
     SaveDialogSetup midi = saveDialogSetup();
-    EXPECT_EQ(midi.filterName, "MIDI files");
-    EXPECT_EQ(midi.pattern, "*.mid");
-    EXPECT_EQ(midi.proposedName, "/songs/take detail");
+    EXPECT_EQ(std::tuple(midi.filterName, midi.pattern, midi.proposedName), std::tuple("MIDI files", "*.mid", "/songs/take detail"));
 }
 
-TEST_F(CommandTableSave, SaveWithoutANameSavedBeforeNeedsTheDialog) {
-    EXPECT_EQ(saveSong(), SAVE_NEEDS_DIALOG);
+TEST_F(CommandTableSave, SaveAsWritesTheWholeSongAndSaveThenRewritesTheSameFileWithoutADialogUntilTheSongCloses) {
+    EXPECT_EQ(saveSong(), SAVE_NEEDS_DIALOG) << "no name saved before";
     setSongNamesFromFile("/songs/take.wav");
     EXPECT_EQ(saveSong(), SAVE_NEEDS_DIALOG);
-}
-
-TEST_F(CommandTableSave, SaveAsWritesTheWholeSongAndSaveThenRewritesTheSameFileWithoutADialog) {
     std::string out = folder.file("take.wav");
     ASSERT_EQ(writeSongOutput(out, false), 1);
-    EXPECT_EQ(dataBytesOf(out), 8192);
-    EXPECT_EQ(songNames.remembered[OUTPUT_WAVE], out);
-    EXPECT_EQ(songNames.lastSaved[OUTPUT_WAVE], out);
+    EXPECT_EQ(std::tuple(dataBytesOf(out), songNames.remembered[OUTPUT_WAVE], songNames.lastSaved[OUTPUT_WAVE]), std::tuple(8192, out, out));
     ASSERT_EQ(fileDelete(out), 0);
     EXPECT_EQ(saveSong(), SAVE_WRITTEN);
-    EXPECT_EQ(dataBytesOf(out), 8192);
-    EXPECT_EQ(messageCount(), 0);
+    EXPECT_EQ(std::tuple(dataBytesOf(out), messageCount()), std::tuple(8192, 0));
+    songWindowClosed();   // closing the song forgets its names
+    EXPECT_EQ(songNames.remembered[OUTPUT_WAVE], "");
+    EXPECT_EQ(songNames.lastSaved[OUTPUT_WAVE], "");
+    EXPECT_EQ(saveSong(), SAVE_NEEDS_DIALOG);
 }
 
 TEST_F(CommandTableSave, OnlyTheSelectedRangeIsWrittenWhenTheBoxIsCheckedAndTheRangeLongEnough) {
@@ -164,23 +157,10 @@ TEST_F(CommandTableSave, MidiOutputGoesToTheMidiWriterAndIsReportedWhenThereIsNo
     EXPECT_EQ(saveSong(), SAVE_WRITTEN);
     ASSERT_EQ(writeSongOutput(out, true), 1);
     EXPECT_EQ(midiWrites, std::vector<std::string>({out + " 1 0", out + " 1 0", out + " 1 1"}));
-}
-
-TEST_F(CommandTableSave, TheProgramSavesMidiThroughTheMidiWriter) {
-    displayModes.playbackMode = PLAYBACK_MODE_MIDI;
+    // The program's own MIDI writer.
     commandOperations.writeNotesMidiFile = saveMidiFile;
-    std::string out = folder.file("take.mid");
     ASSERT_EQ(writeSongOutput(out, false), 1);
     std::vector<uint8_t> bytes = readFileBytes(out);
     ASSERT_GE(bytes.size(), 14u);
     EXPECT_EQ(std::string(bytes.begin(), bytes.begin() + 4), "MThd");
-}
-
-TEST_F(CommandTableSave, ClosingTheSongForgetsItsNames) {
-    std::string out = folder.file("take.wav");
-    ASSERT_EQ(writeSongOutput(out, false), 1);
-    songWindowClosed();
-    EXPECT_EQ(songNames.remembered[OUTPUT_WAVE], "");
-    EXPECT_EQ(songNames.lastSaved[OUTPUT_WAVE], "");
-    EXPECT_EQ(saveSong(), SAVE_NEEDS_DIALOG);
 }

@@ -5,6 +5,7 @@
 
 #include <cstdlib>
 #include <filesystem>
+#include <tuple>
 
 #include "platform/registry.h"
 #include "platform/ui.h"
@@ -14,26 +15,8 @@
 
 namespace fs = std::filesystem;
 
-class SettingsTest : public ::testing::Test {
+class SettingsTest : public ConfigFolderTest {
 protected:
-    void SetUp() override {
-        const char* old = std::getenv("MELODRIFT_CONFIG_DIR");
-        savedConfig = old ? old : "";
-        config = folder.file("config/");
-        setenv("MELODRIFT_CONFIG_DIR", config.c_str(), 1);
-        resetRegistry();
-        resetSettings();
-        clearUiCalls();
-        quitFlag = 0;
-    }
-    void TearDown() override {
-        setenv("MELODRIFT_CONFIG_DIR", savedConfig.c_str(), 1);
-        resetRegistry();
-        resetSettings();
-        clearUiCalls();
-        quitFlag = 0;
-    }
-    std::string machineFile() const { return config + "machine.reg"; }
     void writeMachineFile(const std::string& body) {
         fs::create_directories(config);
         writeFileText(machineFile(), "Melodrift Settings Version 1\n" + body);
@@ -43,17 +26,19 @@ protected:
     }
     std::string machineText() const { return readFileText(machineFile()); }
     bool hasLine(const std::string& line) const { return ("\n" + machineText()).find("\n" + line + "\n") != std::string::npos; }
-
-    TempFolder folder;
-    std::string config;
-    std::string savedConfig;
 };
 
 // ---- the first start ----
 
 using SettingsFirstStart = SettingsTest;
 
-TEST_F(SettingsFirstStart, WritesEveryDefaultWithItsNameAndTypeInTheListedOrder) {
+TEST_F(SettingsFirstStart, WritesEveryDefaultWithItsNameAndTypeInTheListedOrderAndTakesTheDefaults) {
+    generalSettings.pitchRange = 7;
+    generalSettings.splashScreen = false;
+    globalSettings.defaultInstrument = "Flute";
+    globalSettings.meterAnchor = 9;
+    globalSettings.inputWaveQuality = 0;
+    globalSettings.recentFileCount = 3;
     EXPECT_EQ(loadAll(), 4);
     EXPECT_EQ(readFileText(machineFile()),
               "Melodrift Settings Version 1\n"
@@ -92,27 +77,11 @@ TEST_F(SettingsFirstStart, WritesEveryDefaultWithItsNameAndTypeInTheListedOrder)
               "\"Show CSSpeedWarning dialog\"=\"True\"\n"
               "\"CS Boost speed\"=\"False\"\n"
               "\"CS Input wave quality\"=dword:00000005\n");
-    EXPECT_FALSE(fs::exists(config + "user.reg"));
+    EXPECT_FALSE(fs::exists(userFile()));
     EXPECT_EQ(messageCount(), 0);
     EXPECT_EQ(quitFlag, 0u);
-    EXPECT_EQ(globalSettings.meterYOffset, -78);
-    EXPECT_FALSE(globalSettings.hasMainWindowPosition);
-}
-
-TEST_F(SettingsFirstStart, TheRecordsHoldTheDefaultsAfterTheFirstStart) {
-    generalSettings.pitchRange = 7;
-    generalSettings.splashScreen = false;
-    globalSettings.defaultInstrument = "Flute";
-    globalSettings.meterAnchor = 9;
-    globalSettings.inputWaveQuality = 0;
-    globalSettings.recentFileCount = 3;
-    ASSERT_EQ(loadAll(), 4);
-    EXPECT_EQ(generalSettings.pitchRange, 1);
-    EXPECT_TRUE(generalSettings.splashScreen);
-    EXPECT_EQ(globalSettings.defaultInstrument, "Voice");
-    EXPECT_EQ(globalSettings.meterAnchor, 2);
-    EXPECT_EQ(globalSettings.inputWaveQuality, 5);
-    EXPECT_EQ(globalSettings.recentFileCount, 0);
+    EXPECT_TRUE(generalSettings == GeneralSettings{});
+    EXPECT_TRUE(globalSettings == GlobalSettings{});
 }
 
 TEST_F(SettingsFirstStart, ASecondStartChangesNothing) {
@@ -150,30 +119,24 @@ TEST_F(SettingsValues, OnlyTrueSpelledExactlyIsTrue) {
     EXPECT_TRUE(hasLine("\"Quick Prefs\"=\"True \""));
 }
 
-TEST_F(SettingsValues, AMissingValueGetsItsDefaultWrittenAndTheOthersAreKept) {
+TEST_F(SettingsValues, AMissingValueOrOneOfTheWrongTypeGetsItsDefaultWrittenAndTheOthersAreKept) {
     writeMachineFile("[SOFTWARE\\Torvellan\\Melodrift\\1.0\\Global settings]\n"
                      "\"CS Playback Mode\"=dword:00000001\n"
-                     "\"CS Default Instrument\"=\"Flute\"\n");
-    ASSERT_EQ(loadAudioGlobalSettings(), 1);
+                     "\"CS Default Instrument\"=\"Flute\"\n"
+                     "[SOFTWARE\\Torvellan\\Melodrift\\1.0\\General settings]\n"
+                     "\"CS Pitch range\"=\"2\"\n"
+                     "\"Splash screen\"=dword:00000001\n");
+    ASSERT_EQ(loadAll(), 4);
     EXPECT_EQ(globalSettings.playbackMode, 1);
     EXPECT_EQ(globalSettings.defaultInstrument, "Flute");
     EXPECT_EQ(globalSettings.noteMode, 8);
-    EXPECT_TRUE(hasLine("\"CS Playback Mode\"=dword:00000001"));
-    EXPECT_TRUE(hasLine("\"CS Default Instrument\"=\"Flute\""));
-    EXPECT_TRUE(hasLine("\"CS Note Mode\"=dword:00000008"));
-    EXPECT_TRUE(hasLine("\"CS Input wave quality\"=dword:00000005"));
-    EXPECT_EQ(messageCount(), 0);
-}
-
-TEST_F(SettingsValues, AValueOfTheWrongTypeIsReplacedByItsDefault) {
-    writeMachineFile("[SOFTWARE\\Torvellan\\Melodrift\\1.0\\General settings]\n"
-                     "\"CS Pitch range\"=\"2\"\n"
-                     "\"Splash screen\"=dword:00000001\n");
-    ASSERT_EQ(loadGeneralSettings() + loadAudioGeneralSettings(), 2);
     EXPECT_EQ(generalSettings.pitchRange, 1);
     EXPECT_TRUE(generalSettings.splashScreen);
-    EXPECT_TRUE(hasLine("\"CS Pitch range\"=dword:00000001"));
-    EXPECT_TRUE(hasLine("\"Splash screen\"=\"True\""));
+    for (const char* line : {"\"CS Playback Mode\"=dword:00000001", "\"CS Default Instrument\"=\"Flute\"",
+                             "\"CS Note Mode\"=dword:00000008", "\"CS Input wave quality\"=dword:00000005",
+                             "\"CS Pitch range\"=dword:00000001", "\"Splash screen\"=\"True\""})
+        EXPECT_TRUE(hasLine(line)) << line;
+    EXPECT_EQ(messageCount(), 0);
 }
 
 TEST_F(SettingsValues, TheMeterAnchorIsKeptInOneByteAndTheInstrumentInThirtyTwoCharacters) {
@@ -199,10 +162,9 @@ TEST_F(SettingsValues, RecentFilesAreReadUpToTheirLimit) {
                      "\"Recent file 1\"=\"/songs/two.mid\"\n"
                      "\"Recent file 2\"=\"/songs/not counted.wav\"\n");
     ASSERT_EQ(loadGlobalSettings(), 1);
-    EXPECT_EQ(globalSettings.recentFileCount, 2);
-    EXPECT_EQ(globalSettings.recentFiles[0], "/songs/one.wav");
-    EXPECT_EQ(globalSettings.recentFiles[1], "/songs/two.mid");
-    EXPECT_EQ(globalSettings.recentFiles[2], "");
+    const GlobalSettings& g = globalSettings;
+    EXPECT_EQ(std::tuple(g.recentFileCount, g.recentFiles[0], g.recentFiles[1], g.recentFiles[2]),
+              std::tuple(2, "/songs/one.wav", "/songs/two.mid", ""));
 
     // A damaged count neither hangs start-up nor fills the file with millions of values.
     writeMachineFile("[SOFTWARE\\Torvellan\\Melodrift\\1.0\\Global settings]\n"
@@ -236,11 +198,11 @@ TEST_F(SettingsValues, TheWindowPlacementIsWrittenOnlyWhenThereIsOne) {
     ASSERT_EQ(loadGlobalSettings(), 1);
     ASSERT_TRUE(globalSettings.hasMainWindowPosition);
     for (int i = 0; i < WINDOW_PLACEMENT_SIZE; i++) EXPECT_EQ(globalSettings.mainWindowPosition[i], uint8_t(250 + i));
-}
 
-TEST_F(SettingsValues, APlacementOfTheWrongSizeCountsAsNone) {
+    // A placement of the wrong size counts as none.
     writeMachineFile("[SOFTWARE\\Torvellan\\Melodrift\\1.0\\Global settings]\n"
                      "\"Main window position\"=hex:2c,00,00\n");
+    resetRegistry();
     ASSERT_EQ(loadGlobalSettings(), 1);
     EXPECT_FALSE(globalSettings.hasMainWindowPosition);
     EXPECT_TRUE(hasLine("\"Main window position\"=hex:2c,00,00"));
@@ -278,6 +240,8 @@ TEST_F(SettingsValues, EverySavedValueComesBackOnTheNextStart) {
     global.recentFileCount = 2;
     global.recentFiles[0] = "/a/b.wav";
     global.recentFiles[1] = "/c/d \"e\".mid";
+    global.hasMainWindowPosition = true;
+    for (int i = 0; i < WINDOW_PLACEMENT_SIZE; i++) global.mainWindowPosition[i] = uint8_t(7 * i);
     generalSettings = general;
     globalSettings = global;
     ASSERT_EQ(saveGeneralSettings() + saveAudioGeneralSettings() + saveGlobalSettings() + saveAudioGlobalSettings(), 4);
@@ -285,33 +249,8 @@ TEST_F(SettingsValues, EverySavedValueComesBackOnTheNextStart) {
     resetRegistry();
     resetSettings();
     ASSERT_EQ(loadAll(), 4);
-    const GeneralSettings& g = generalSettings;
-    EXPECT_EQ(g.pitchRange, 2);
-    EXPECT_TRUE(g.enhancedPitchAccuracy);
-    EXPECT_FALSE(g.detectSyllables);
-    EXPECT_TRUE(g.disableWaveEditing);
-    EXPECT_FALSE(g.drawSmoothLines || g.drawTransparencies || g.drawGradients || g.splashScreen || g.quickPrefs);
-    const GlobalSettings& s = globalSettings;
-    EXPECT_EQ(s.playbackMode, 1);
-    EXPECT_EQ(s.noteMode, 4);
-    EXPECT_EQ(s.scaleMode, 16);
-    EXPECT_EQ(s.meterWidth, 321);
-    EXPECT_EQ(s.meterHeight, 123);
-    EXPECT_EQ(s.meterXOffset, -5);
-    EXPECT_EQ(s.meterYOffset, 77);
-    EXPECT_EQ(s.meterAnchor, 255);
-    EXPECT_EQ(s.defaultInstrument, "Alto \"sax\" \\ 2");
-    EXPECT_FALSE(s.showSpeedWarning);
-    EXPECT_TRUE(s.boostSpeed);
-    EXPECT_EQ(s.inputWaveQuality, 9);
-    EXPECT_FALSE(s.translucentWindows);
-    EXPECT_EQ(s.openFilter, 2);
-    EXPECT_EQ(s.saveFilter, 1);
-    EXPECT_EQ(s.openDirectory, "/home/singer/My \"Takes\"\\2024\n");
-    EXPECT_EQ(s.saveDirectory, "/home/singer/out/");
-    EXPECT_EQ(s.recentFileCount, 2);
-    EXPECT_EQ(s.recentFiles[0], "/a/b.wav");
-    EXPECT_EQ(s.recentFiles[1], "/c/d \"e\".mid");
+    EXPECT_TRUE(generalSettings == general);
+    EXPECT_TRUE(globalSettings == global);
     EXPECT_TRUE(hasLine("\"CS Meter x-offset\"=dword:fffffffb"));
     EXPECT_TRUE(hasLine("\"Open Directory\"=\"/home/singer/My \\\"Takes\\\"\\\\2024\\n\""));
 }
@@ -324,31 +263,25 @@ TEST_F(SettingsFailures, AConfigFolderThatCannotBeCreatedStopsStartUp) {
     // A file where the folder should be: creating it fails even for root.
     writeFileText(folder.file("config"), "in the way");
     EXPECT_EQ(loadGeneralSettings(), 0);
-    EXPECT_EQ(lastMessageText(), "Can't access registry properly");
-    EXPECT_EQ(uiCalls().back().kind, MESSAGE_ERROR);
-    EXPECT_EQ(uiCalls().back().title, "Message from Torvellan Melodrift");
-    EXPECT_EQ(quitFlag, 1u);
+    EXPECT_EQ(std::tuple(lastMessageText(), uiCalls().back().kind, uiCalls().back().title, quitFlag),
+              std::tuple("Can't access registry properly", MESSAGE_ERROR, "Message from Torvellan Melodrift", 1u));
     EXPECT_TRUE(generalSettings.splashScreen);
     EXPECT_EQ(readFileText(folder.file("config")), "in the way");
+
+    // A save that cannot open its section is reported but does not quit.
+    quitFlag = 0;
+    clearUiCalls();
+    EXPECT_EQ(saveGeneralSettings(), 0);
+    EXPECT_EQ(lastMessageText(), "Can't access registry properly");
+    EXPECT_EQ(saveAudioGlobalSettings(), 0);
+    EXPECT_EQ(std::tuple(messageCount(), quitFlag), std::tuple(2, 0u));
 }
 
 TEST_F(SettingsFailures, ASettingsFileThatCannotBeReadStopsStartUpWithItsErrorNumber) {
     fs::create_directories(machineFile());   // a folder where the file should be
     EXPECT_EQ(loadAudioGlobalSettings(), 0);
-    EXPECT_EQ(lastMessageText(), "Can't open registry - Err 29");
-    EXPECT_EQ(messageCount(), 1);
-    EXPECT_EQ(quitFlag, 1u);
-    EXPECT_EQ(globalSettings.playbackMode, 2);
-}
-
-TEST_F(SettingsFailures, ASaveThatCannotOpenItsSectionIsReportedButDoesNotQuit) {
-    writeFileText(folder.file("config"), "in the way");
-    EXPECT_EQ(saveGeneralSettings(), 0);
-    EXPECT_EQ(lastMessageText(), "Can't access registry properly");
-    EXPECT_EQ(quitFlag, 0u);
-    EXPECT_EQ(saveAudioGlobalSettings(), 0);
-    EXPECT_EQ(messageCount(), 2);
-    EXPECT_EQ(quitFlag, 0u);
+    EXPECT_EQ(std::tuple(lastMessageText(), messageCount(), quitFlag, globalSettings.playbackMode),
+              std::tuple("Can't open registry - Err 29", 1, 1u, 2));
 }
 
 TEST_F(SettingsFailures, ADamagedFileIsReportedKeptAsideAndTheDefaultsAreUsed) {
@@ -384,30 +317,22 @@ TEST_F(SettingsFailures, AReadOnlySectionStillGivesTheDefaults) {
 
 // ---- the recording format index ----
 
-TEST(SettingsRecordingFormat, TheIndexSelectsRateByQuarterAndLayoutByRemainder) {
+TEST(SettingsRecordingFormat, TheIndexSelectsRateByQuarterAndLayoutByRemainderAndOutOfRangeGivesTheDefault) {
     struct Case {
         int index;
         uint32_t rate;
         int bits;
         int channels;
+        int valid;
     };
-    const Case cases[] = {{8, 22050, 8, 1},  {9, 22050, 16, 1}, {5, 44100, 16, 1}, {0, 48000, 8, 1},
-                          {2, 48000, 8, 2},  {3, 48000, 16, 2}, {14, 11025, 8, 2}, {19, 8000, 16, 2}};
+    const Case cases[] = {{8, 22050, 8, 1, 1},   {9, 22050, 16, 1, 1},  {5, 44100, 16, 1, 1}, {0, 48000, 8, 1, 1},
+                          {2, 48000, 8, 2, 1},   {3, 48000, 16, 2, 1},  {14, 11025, 8, 2, 1}, {19, 8000, 16, 2, 1},
+                          {20, 44100, 16, 1, 0}, {-1, 44100, 16, 1, 0}, {1000000, 44100, 16, 1, 0}};
     for (const Case& c : cases) {
         RecordingFormat format{};
-        EXPECT_EQ(decodeRecordingFormat(c.index, &format), 1) << c.index;
+        EXPECT_EQ(decodeRecordingFormat(c.index, &format), c.valid) << c.index;
         EXPECT_EQ(format.samplesPerSecond, c.rate) << c.index;
         EXPECT_EQ(format.bitsPerSample, c.bits) << c.index;
         EXPECT_EQ(format.channels, c.channels) << c.index;
-    }
-}
-
-TEST(SettingsRecordingFormat, AnIndexOutOfRangeIsRefusedAndGivesTheDefaultFormat) {
-    for (int index : {20, -1, 1000000}) {
-        RecordingFormat format{};
-        EXPECT_EQ(decodeRecordingFormat(index, &format), 0) << index;
-        EXPECT_EQ(format.samplesPerSecond, 44100u);
-        EXPECT_EQ(format.bitsPerSample, 16);
-        EXPECT_EQ(format.channels, 1);
     }
 }

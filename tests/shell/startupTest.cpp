@@ -16,32 +16,20 @@
 #include "shell/startup.h"
 #include "support/testSupport.h"
 
-class StartUp : public ::testing::Test {
+// Start-up resolves the paths anew; the fixture puts the run's back.
+class StartUp : public ConfigFolderTest {
 protected:
     void SetUp() override {
-        const char* config = std::getenv("MELODRIFT_CONFIG_DIR");
-        savedConfig = config ? config : "";
-        savedPaths = paths;   // start-up resolves the paths anew; later suites need the run's
-        setenv("MELODRIFT_CONFIG_DIR", folder.file("config").c_str(), 1);
-        resetRegistry();
+        ConfigFolderTest::SetUp();
         options.sharedBasePath = folder.path();
-        clearUiCalls();
     }
     void TearDown() override {
         if (appState.started) shutDown(0);
         releaseInstanceLock();
         setFreeDiskSpaceOverride(NO_FREE_SPACE_OVERRIDE);
-        setenv("MELODRIFT_CONFIG_DIR", savedConfig.c_str(), 1);
-        resetRegistry();
-        paths = savedPaths;
-        clearUiCalls();
+        ConfigFolderTest::TearDown();
     }
-    std::string shared(const std::string& name) const { return folder.path() + "Torvellan Shared/" + name; }
-
-    TempFolder folder;
     StartupOptions options{};
-    std::string savedConfig;
-    Paths savedPaths;
 };
 
 TEST_F(StartUp, RemovesWhatAnEarlierRunLeftInTheSharedFolder) {
@@ -104,33 +92,24 @@ static const char* NO_SPACE =
     "There is less than 1Mb of free disc space to store scanned pages and data. Please free some disc space and try "
     "again. Notaglyph will now exit.";
 
-TEST_F(StartUp, LessThanOneMebibyteFreeRefusesToStartAndGivesTheLockBack) {
-    setFreeDiskSpaceOverride(1048575);
-    EXPECT_EQ(startUp(options), 0);
-    EXPECT_EQ(lastMessageText(), NO_SPACE);
-    EXPECT_FALSE(fileExists(shared("!InUse")));
-    EXPECT_FALSE(instanceLockHeld());
-}
-
-TEST_F(StartUp, BetweenOneAndFourMebibytesWarnsOnceAndStarts) {
-    setFreeDiskSpaceOverride(1048576);
-    ASSERT_EQ(startUp(options), 1);
-    EXPECT_EQ(messageCount(), 1);
-    EXPECT_EQ(lastMessageText(), LOW_SPACE);
-    shutDown(0);
-
-    clearUiCalls();
-    setFreeDiskSpaceOverride(4194303);
-    ASSERT_EQ(startUp(options), 1);
-    EXPECT_EQ(lastMessageText(), LOW_SPACE);
-}
-
-TEST_F(StartUp, FourMebibytesOrAnUnknownOrHugeFigureStartsSilently) {
-    for (int64_t space : {int64_t(4194304), int64_t(-1), int64_t(5000000000)}) {
+// Below 1 MiB start-up is refused and the lock given back; below 4 MiB it warns once; from
+// 4 MiB on, or with an unknown or huge figure, it starts silently.
+TEST_F(StartUp, TheFreeSpaceDecidesWhetherStartUpWarnsOrStops) {
+    struct Case {
+        int64_t space;
+        int started;
+        const char* text;
+    } cases[] = {{1048575, 0, NO_SPACE}, {1048576, 1, LOW_SPACE},  {4194303, 1, LOW_SPACE},
+                 {4194304, 1, nullptr},  {-1, 1, nullptr},         {5000000000, 1, nullptr}};
+    for (const Case& c : cases) {
         clearUiCalls();
-        setFreeDiskSpaceOverride(space);
-        EXPECT_EQ(checkFreeDiskSpace(), DISK_SPACE_ENOUGH) << space;
-        EXPECT_EQ(messageCount(), 0) << space;
+        setFreeDiskSpaceOverride(c.space);
+        EXPECT_EQ(startUp(options), c.started) << c.space;
+        EXPECT_EQ(messageCount(), c.text ? 1 : 0) << c.space;
+        if (c.text) EXPECT_EQ(lastMessageText(), c.text);
+        EXPECT_EQ(instanceLockHeld(), c.started == 1);
+        EXPECT_EQ(fileExists(shared("!InUse")), c.started == 1);
+        if (c.started) shutDown(0);
     }
 }
 

@@ -9,9 +9,9 @@
 #include <string>
 #include <vector>
 
+#include "platform/allocation.h"
 #include "platform/files.h"
 #include "platform/ui.h"
-#include "shell/paths.h"
 #include "store/ftBlockStore.h"
 #include "store/song.h"
 #include "support/testSupport.h"
@@ -137,30 +137,20 @@ inline ::testing::AssertionResult windowBlockIs(uint32_t b, const TestBlock& exp
            << " (block " << b << ")";
 }
 
-// Each test has a shared folder of its own, whatever another suite left in paths.
-class FTBlockStoreTest : public ::testing::Test {
+// Each test has a shared folder of its own and an empty store.
+class FTBlockStoreTest : public SharedFolderTest {
 protected:
     void SetUp() override {
-        savedPaths = paths;
-        setSharedBasePath(folder.path());
-        makeFolder(paths.sharedFolder);
+        SharedFolderTest::SetUp();
         clean();
     }
     void TearDown() override {
         clean();
-        paths = savedPaths;
+        SharedFolderTest::TearDown();
     }
-    void clean() {
+    static void clean() {
         closeFTFile(0);
         freeFTBlockWindow();
         resetSong();
-        clearUiCalls();
-        clearFileFailures();
-        failFTAllocation(0);
-        fileDelete(ftPath());
-        fileDelete(fiPath());
-        fileDelete(sharedFilePath("CS.tw"));
     }
-    TempFolder folder;
-    Paths savedPaths;
 };

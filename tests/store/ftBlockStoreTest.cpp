@@ -3,6 +3,8 @@
 // opening and closing, and every message a corrupt or hostile file gives.
 #include <gtest/gtest.h>
 
+#include <tuple>
+
 #include "store/ftBlockStoreFixtures.h"
 
 namespace {
@@ -17,6 +19,10 @@ const char* const SEEK_PAST_END =
     "Attempting to seeking past end of file in seekToFTBlock (2). Data will probably be corrupted.";
 const char* const CANNOT_WRITE =
     "Frequency data cannot be written to FT file in seekToFTBlock (1). Data will probably be corrupted.";
+const char* const DATA_CORRUPT = "dataBuffer->nEntries is corrupt so cannot read FT block - readFTBlock (3)";
+const char* const ORIG_CORRUPT = "origDataBuffer->nEntries is corrupt so cannot read FT block - readFTBlock (5)";
+const char* const DETECTED_CORRUPT =
+    "detectedFrequenciesBuffer->nEntries is corrupt so cannot read FT block - readFTBlock (7)";
 
 // A stream on a scratch file in the shared folder, closed with the test.
 struct ScratchFile {
@@ -45,6 +51,10 @@ TestBlock sentinelBlock() {
     return b;
 }
 
+int seek(uint32_t block, int forWrite, int truncate, int* ok) {
+    return int(seekToFTBlock(ftFiles.ftFile, ftFiles.ftIndexFile, block, forWrite, truncate, ok));
+}
+
 // ---- stored bytes ----
 
 TEST_F(FTBlockFormat, ABlockWithNoEntriesIsStoredAsTwelveZeroBytes) {
@@ -52,8 +62,7 @@ TEST_F(FTBlockFormat, ABlockWithNoEntriesIsStoredAsTwelveZeroBytes) {
     ASSERT_EQ(openFTFile(FT_UPDATE), 1);
     TestBlock empty = makeBlock(0, 0, 0, 0);
     int ok = 0;
-    EXPECT_EQ(seekToFTBlock(ftFiles.ftFile, ftFiles.ftIndexFile, 0, 1, 1, &ok), 0u);
-    EXPECT_EQ(ok, 1);
+    EXPECT_EQ(std::tuple(seek(0, 1, 1, &ok), ok), std::tuple(0, 1));
     EXPECT_EQ(writeFTBlock(ftFiles.ftFile, 0, &empty.data, &empty.orig, &empty.detected), 12u);
     EXPECT_EQ(setFTBlockSize(ftFiles.ftIndexFile, 0, 12), 1);
     ASSERT_EQ(closeFTFile(1), 1);
@@ -85,29 +94,41 @@ TEST_F(FTBlockFormat, EachBufferIsStoredAsItsCountThenItsEntries) {
     EXPECT_EQ(out.bytes(), expected);
 }
 
-TEST_F(FTBlockFormat, AFullBlockReadsBackAsWrittenAndLeavesTheMemoryOnlyBytesAlone) {
-    TestBlock full = makeBlock(5, 255, 255, 15);
+TEST_F(FTBlockFormat, FullBlocksReadBackAsWrittenOneAfterAnotherAndLeaveTheMemoryOnlyBytesAlone) {
+    std::vector<TestBlock> blocks = makeBlocks(6);
+    blocks[2] = makeBlock(5, 255, 255, 15);
     ScratchFile out({}, "wb");
-    ASSERT_EQ(writeFTBlock(out.f, 0, &full.data, &full.orig, &full.detected), ftBlockBytes(255, 255, 15));
+    for (TestBlock& b : blocks)
+        ASSERT_EQ(writeFTBlock(out.f, 0, &b.data, &b.orig, &b.detected),
+                  ftBlockBytes(b.data.nEntries, b.orig.nEntries, b.detected.nEntries));
+    EXPECT_EQ(ftBlockBytes(255, 255, 15), 6312u);
     std::vector<uint8_t> stored = out.bytes();
-    EXPECT_EQ(stored, blockBytes(full));
+    EXPECT_EQ(stored, modelFiles(blocks).ft);
     ScratchFile in(stored);
-    TestBlock back = sentinelBlock();
-    EXPECT_EQ(readFTBlock(in.f, 0, &back.data, &back.orig, &back.detected), 6312u);
-    EXPECT_TRUE(sameBlock(back, full));
-    EXPECT_EQ(back.data.blockLoudness, 201);
-    EXPECT_EQ(back.data.blockFlags, 9);
-    EXPECT_EQ(back.orig.blockLoudness, 202);
+    for (const TestBlock& expected : blocks) {
+        TestBlock back = sentinelBlock();
+        EXPECT_EQ(readFTBlock(in.f, 0, &back.data, &back.orig, &back.detected), uint32_t(blockBytes(expected).size()));
+        EXPECT_TRUE(sameBlock(back, expected));
+        EXPECT_EQ(back.data.blockLoudness, 201);
+        EXPECT_EQ(back.data.blockFlags, 9);
+        EXPECT_EQ(back.orig.blockLoudness, 202);
+    }
+    EXPECT_EQ(messageCount(), 0);
 }
 
-TEST_F(FTBlockFormat, CountsBeyondTheBuffersAreRefusedBeforeAnythingIsWritten) {
+TEST_F(FTBlockFormat, AWriteRefusedForItsCountsOrItsMemoryWritesNothing) {
+    std::string memory = "Could not allocate continuousDataBuffer so data could not be written - writeFTBlock (";
     struct Case {
         uint32_t nData, nOrig, nDetected;
-        const char* text;
+        int failingAllocation;
+        std::string text;
     } cases[] = {
-        {256, 0, 0, "dataBuffer->nEntries is corrupt so cannot write FT block - writeFTBlock (3)"},
-        {3, 256, 0, "origDataBuffer->nEntries is corrupt so cannot write FT block - writeFTBlock (5)"},
-        {3, 3, 16, "detectedFrequenciesBuffer->nEntries is corrupt so cannot write FT block - writeFTBlock (7)"},
+        {256, 0, 0, 0, "dataBuffer->nEntries is corrupt so cannot write FT block - writeFTBlock (3)"},
+        {3, 256, 0, 0, "origDataBuffer->nEntries is corrupt so cannot write FT block - writeFTBlock (5)"},
+        {3, 3, 16, 0, "detectedFrequenciesBuffer->nEntries is corrupt so cannot write FT block - writeFTBlock (7)"},
+        {2, 2, 2, 1, memory + "4)"},
+        {2, 2, 2, 2, memory + "6)"},
+        {2, 2, 2, 3, memory + "8)"},
     };
     for (const Case& c : cases) {
         TestBlock b = makeBlock(1, 3, 3, 3);
@@ -115,23 +136,10 @@ TEST_F(FTBlockFormat, CountsBeyondTheBuffersAreRefusedBeforeAnythingIsWritten) {
         b.orig.nEntries = c.nOrig;
         b.detected.nEntries = c.nDetected;
         ScratchFile out({}, "wb");
+        failAllocation(c.failingAllocation);
         EXPECT_EQ(writeFTBlock(out.f, 0, &b.data, &b.orig, &b.detected), 0u);
         EXPECT_EQ(lastMessageText(), c.text);
         EXPECT_TRUE(out.bytes().empty()) << c.text;
-    }
-}
-
-TEST_F(FTBlockFormat, AWriteThatCannotGetItsMemoryWritesNothing) {
-    const char* texts[] = {"Could not allocate continuousDataBuffer so data could not be written - writeFTBlock (4)",
-                           "Could not allocate continuousDataBuffer so data could not be written - writeFTBlock (6)",
-                           "Could not allocate continuousDataBuffer so data could not be written - writeFTBlock (8)"};
-    TestBlock b = makeBlock(1, 2, 2, 2);
-    for (int n = 1; n <= 3; n++) {
-        ScratchFile out({}, "wb");
-        failFTAllocation(n);
-        EXPECT_EQ(writeFTBlock(out.f, 0, &b.data, &b.orig, &b.detected), 0u);
-        EXPECT_EQ(lastMessageText(), texts[n - 1]);
-        EXPECT_TRUE(out.bytes().empty());
     }
 }
 
@@ -150,148 +158,80 @@ TEST_F(FTBlockFormat, ReadingAndWritingNeedAFileAndABlockInTheWindow) {
     for (const UiCall& call : uiCalls()) EXPECT_EQ(call.kind, MESSAGE_ERROR);
 }
 
-// ---- corrupt blocks ----
+// ---- blocks that cannot be read ----
 
-TEST_F(FTBlockRead, ACorruptDataCountLeavesEveryBufferAsItWas) {
-    std::vector<uint8_t> bytes;
-    putU32(bytes, 256);
-    bytes.resize(4000, 0);
-    ScratchFile in(bytes);
-    TestBlock back = sentinelBlock();
-    EXPECT_EQ(readFTBlock(in.f, 0, &back.data, &back.orig, &back.detected), 0u);
-    EXPECT_EQ(lastMessageText(), "dataBuffer->nEntries is corrupt so cannot read FT block - readFTBlock (3)");
-    EXPECT_TRUE(sameBlock(back, sentinelBlock()));
-}
-
-TEST_F(FTBlockRead, BuffersReadBeforeACorruptCountKeepTheirNewContents) {
-    TestBlock good = makeBlock(4, 2, 3, 1);
-    std::vector<uint8_t> origCorrupt;
-    putEntries(origCorrupt, good.data.entries, 2);
-    putU32(origCorrupt, 300);
-    origCorrupt.resize(origCorrupt.size() + 4000, 0);
-    {
-        ScratchFile in(origCorrupt);
-        TestBlock back = sentinelBlock();
-        EXPECT_EQ(readFTBlock(in.f, 0, &back.data, &back.orig, &back.detected), 0u);
-        EXPECT_EQ(lastMessageText(), "origDataBuffer->nEntries is corrupt so cannot read FT block - readFTBlock (5)");
-        TestBlock expected = sentinelBlock();
-        expected.data = good.data;
-        EXPECT_TRUE(sameBlock(back, expected));
-    }
-    std::vector<uint8_t> detectedCorrupt;
-    putEntries(detectedCorrupt, good.data.entries, 2);
-    putEntries(detectedCorrupt, good.orig.entries, 3);
-    putU32(detectedCorrupt, 16);
-    detectedCorrupt.resize(detectedCorrupt.size() + 400, 0);
-    {
-        ScratchFile in(detectedCorrupt);
-        TestBlock back = sentinelBlock();
-        EXPECT_EQ(readFTBlock(in.f, 0, &back.data, &back.orig, &back.detected), 0u);
-        EXPECT_EQ(lastMessageText(),
-                  "detectedFrequenciesBuffer->nEntries is corrupt so cannot read FT block - readFTBlock (7)");
-        TestBlock expected = sentinelBlock();
-        expected.data = good.data;
-        expected.orig = good.orig;
-        EXPECT_TRUE(sameBlock(back, expected));
-    }
-}
-
-TEST_F(FTBlockRead, ABlockCutShortIsACorruptCountNotGarbage) {
+// A corrupt count, a block cut short or memory that cannot be had stops the read at that
+// buffer: the buffers before it keep their new contents, the others are left as they were.
+TEST_F(FTBlockRead, AFailedReadKeepsTheBuffersReadBeforeItAndLeavesTheRest) {
     TestBlock good = makeBlock(4, 5, 5, 2);
     std::vector<uint8_t> whole = blockBytes(good);
+    auto cut = [&](size_t keep) { return std::vector<uint8_t>(whole.begin(), whole.begin() + long(keep)); };
+    // The block with the count of buffer n replaced by count, and room for what it claims.
+    auto withCount = [&](int n, uint32_t count) {
+        std::vector<uint8_t> b;
+        if (n > 0) putEntries(b, good.data.entries, good.data.nEntries);
+        if (n > 1) putEntries(b, good.orig.entries, good.orig.nEntries);
+        putU32(b, count);
+        b.resize(b.size() + 4000, 0);
+        return b;
+    };
+    const char* memory = "Could not allocate continuousDataBuffer so data could not be read - readFTBlock (";
     struct Case {
-        size_t keep;          // bytes of the block left in the file
-        const char* text;
-        int buffersRead;      // buffers that take new contents before the failure
+        std::vector<uint8_t> bytes;
+        int failingAllocation;
+        std::string text;
+        int buffersRead;   // buffers that take new contents before the failure
     } cases[] = {
-        {0, "dataBuffer->nEntries is corrupt so cannot read FT block - readFTBlock (3)", 0},
-        {2, "dataBuffer->nEntries is corrupt so cannot read FT block - readFTBlock (3)", 0},
-        {4 + 12 * 5 - 1, "dataBuffer->nEntries is corrupt so cannot read FT block - readFTBlock (3)", 0},
-        {4 + 12 * 5 + 4 + 30, "origDataBuffer->nEntries is corrupt so cannot read FT block - readFTBlock (5)", 1},
-        {whole.size() - 1, "detectedFrequenciesBuffer->nEntries is corrupt so cannot read FT block - readFTBlock (7)", 2},
+        {withCount(0, 256), 0, DATA_CORRUPT, 0},
+        {withCount(1, 300), 0, ORIG_CORRUPT, 1},
+        {withCount(2, 16), 0, DETECTED_CORRUPT, 2},
+        {cut(0), 0, DATA_CORRUPT, 0},
+        {cut(2), 0, DATA_CORRUPT, 0},
+        {cut(4 + 12 * 5 - 1), 0, DATA_CORRUPT, 0},
+        {cut(4 + 12 * 5 + 4 + 30), 0, ORIG_CORRUPT, 1},
+        {cut(whole.size() - 1), 0, DETECTED_CORRUPT, 2},
+        {whole, 1, std::string(memory) + "4)", 0},
+        {whole, 2, std::string(memory) + "6)", 1},
+        {whole, 3, std::string(memory) + "8)", 2},
     };
     for (const Case& c : cases) {
-        ScratchFile in(std::vector<uint8_t>(whole.begin(), whole.begin() + long(c.keep)));
+        ScratchFile in(c.bytes);
         TestBlock back = sentinelBlock();
-        EXPECT_EQ(readFTBlock(in.f, 0, &back.data, &back.orig, &back.detected), 0u) << c.keep;
-        EXPECT_EQ(lastMessageText(), c.text) << c.keep;
+        failAllocation(c.failingAllocation);
+        EXPECT_EQ(readFTBlock(in.f, 0, &back.data, &back.orig, &back.detected), 0u) << c.text;
+        EXPECT_EQ(lastMessageText(), c.text);
         TestBlock expected = sentinelBlock();
         if (c.buffersRead >= 1) expected.data = good.data;
         if (c.buffersRead >= 2) expected.orig = good.orig;
-        EXPECT_TRUE(sameBlock(back, expected)) << c.keep;
+        EXPECT_TRUE(sameBlock(back, expected)) << c.text << " after " << c.bytes.size() << " bytes";
     }
-}
-
-TEST_F(FTBlockRead, AReadThatCannotGetItsMemoryStopsAtThatBuffer) {
-    const char* texts[] = {"Could not allocate continuousDataBuffer so data could not be read - readFTBlock (4)",
-                           "Could not allocate continuousDataBuffer so data could not be read - readFTBlock (6)",
-                           "Could not allocate continuousDataBuffer so data could not be read - readFTBlock (8)"};
-    TestBlock good = makeBlock(8, 4, 4, 4);
-    for (int n = 1; n <= 3; n++) {
-        ScratchFile in(blockBytes(good));
-        TestBlock back = sentinelBlock();
-        failFTAllocation(n);
-        EXPECT_EQ(readFTBlock(in.f, 0, &back.data, &back.orig, &back.detected), 0u);
-        EXPECT_EQ(lastMessageText(), texts[n - 1]);
-        TestBlock expected = sentinelBlock();
-        if (n >= 2) expected.data = good.data;
-        if (n >= 3) expected.orig = good.orig;
-        EXPECT_TRUE(sameBlock(back, expected)) << n;
-    }
-}
-
-TEST_F(FTBlockRead, BlocksFollowOneAnotherWithoutSeeking) {
-    std::vector<TestBlock> blocks = makeBlocks(6);
-    ScratchFile in(modelFiles(blocks).ft);
-    for (const TestBlock& expected : blocks) {
-        TestBlock back = sentinelBlock();
-        EXPECT_EQ(readFTBlock(in.f, 0, &back.data, &back.orig, &back.detected), uint32_t(blockBytes(expected).size()));
-        EXPECT_TRUE(sameBlock(back, expected));
-    }
-    EXPECT_EQ(messageCount(), 0);
 }
 
 // ---- the index ----
 
-TEST_F(FTBlockIndex, AppendingToAnEmptyIndexWritesEntryZeroAndACountOfOne) {
+TEST_F(FTBlockIndex, AppendingWritesTheNewEntryWhereTheLastBlockEndsAndFlushesTheCount) {
     song.blockCount = 1;
     ASSERT_EQ(openFTFile(FT_UPDATE), 1);
     int ok = 0;
-    EXPECT_EQ(seekToFTBlock(ftFiles.ftFile, ftFiles.ftIndexFile, 0, 1, 0, &ok), 0u);
+    EXPECT_EQ(seek(0, 1, 0, &ok), 0);
     EXPECT_EQ(ok, 1);
     EXPECT_EQ(readFileBytes(fiPath()), (std::vector<uint8_t>{1, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0}))
         << "the index is flushed as soon as the entry is appended";
     closeFTFile(1);
-}
 
-TEST_F(FTBlockIndex, AnAppendedBlockStartsWhereTheLastOneEnds) {
-    std::vector<TestBlock> blocks = makeBlocks(3);
-    storeModel(blocks);
-    song.blockCount = 4;
-    ASSERT_EQ(openFTFile(FT_UPDATE), 1);
-    int ok = 0;
-    EXPECT_EQ(seekToFTBlock(ftFiles.ftFile, ftFiles.ftIndexFile, 3, 1, 1, &ok), 0u);
-    EXPECT_EQ(ok, 1);
-    EXPECT_EQ(fileTell(ftFiles.ftFile), int64_t(modelFiles(blocks).ft.size()));
-    closeFTFile(1);
-    std::vector<uint8_t> fi = readFileBytes(fiPath());
-    ASSERT_EQ(fi.size(), 4u + 8 * 4);
-    EXPECT_EQ(getU32(fi, 0), 4u);
-    EXPECT_EQ(getU32(fi, 4 + 8 * 3), uint32_t(modelFiles(blocks).ft.size()));
-    EXPECT_EQ(getU32(fi, 8 + 8 * 3), 0u);
-}
-
-TEST_F(FTBlockIndex, WritingMoreThanOnePastTheCountIsRefused) {
     std::vector<TestBlock> blocks = makeBlocks(3);
     storeModel(blocks);
     song.blockCount = 10;
     ASSERT_EQ(openFTFile(FT_UPDATE), 1);
-    int ok = 1;
-    EXPECT_EQ(seekToFTBlock(ftFiles.ftFile, ftFiles.ftIndexFile, 4, 1, 1, &ok), 0u);
-    EXPECT_EQ(ok, 0);
+    EXPECT_EQ(std::tuple(seek(4, 1, 1, &ok), ok), std::tuple(0, 0)) << "more than one past the count";
     EXPECT_EQ(lastMessageText(), CANNOT_WRITE);
+    EXPECT_EQ(std::tuple(seek(3, 1, 1, &ok), ok), std::tuple(0, 1));
+    EXPECT_EQ(fileTell(ftFiles.ftFile), int64_t(modelFiles(blocks).ft.size()));
     closeFTFile(1);
-    EXPECT_EQ(readFileBytes(fiPath()), modelFiles(blocks).fi);
+    std::vector<uint8_t> fi = readFileBytes(fiPath());
+    ASSERT_EQ(fi.size(), 4u + 8 * 4);
+    EXPECT_EQ(std::tuple(getU32(fi, 0), getU32(fi, 4 + 8 * 3), getU32(fi, 8 + 8 * 3)),
+              std::tuple(4u, uint32_t(modelFiles(blocks).ft.size()), 0u));
 }
 
 TEST_F(FTBlockIndex, RewritingWithTruncateDropsEveryLaterBlock) {
@@ -300,11 +240,9 @@ TEST_F(FTBlockIndex, RewritingWithTruncateDropsEveryLaterBlock) {
     storeModel(blocks);
     ASSERT_EQ(openFTFile(FT_UPDATE), 1);
     int ok = 0;
-    EXPECT_EQ(seekToFTBlock(ftFiles.ftFile, ftFiles.ftIndexFile, 2, 1, 0, &ok), getU32(m.fi, 8 + 16));
-    EXPECT_EQ(ok, 1);
+    EXPECT_EQ(std::tuple(seek(2, 1, 0, &ok), ok), std::tuple(int(getU32(m.fi, 8 + 16)), 1));
     EXPECT_EQ(readFileBytes(fiPath()), m.fi) << "without truncate the index stays as it is";
-    EXPECT_EQ(seekToFTBlock(ftFiles.ftFile, ftFiles.ftIndexFile, 2, 1, 1, &ok), getU32(m.fi, 8 + 16));
-    EXPECT_EQ(ok, 1);
+    EXPECT_EQ(std::tuple(seek(2, 1, 1, &ok), ok), std::tuple(int(getU32(m.fi, 8 + 16)), 1));
     EXPECT_EQ(fileTell(ftFiles.ftFile), int64_t(getU32(m.fi, 4 + 16)));
     closeFTFile(1);
     std::vector<uint8_t> expected = m.fi;
@@ -319,21 +257,21 @@ TEST_F(FTBlockIndex, TheBlockAfterTheLastIsWhereTheDataEndsAndTheOneAfterThatIsR
     storeModel(blocks);
     ASSERT_EQ(openFTFile(FT_READ), 1);
     int ok = 0;
-    EXPECT_EQ(getFTBlockIndex(ftFiles.ftIndexFile, 2, &ok), getU32(m.fi, 4 + 16));
-    EXPECT_EQ(ok, 1);
-    EXPECT_EQ(getFTBlockIndex(ftFiles.ftIndexFile, 4, &ok), uint32_t(m.ft.size()));
-    EXPECT_EQ(ok, 1);
+    auto indexOf = [&](uint32_t block) { uint32_t at = getFTBlockIndex(ftFiles.ftIndexFile, block, &ok); return std::tuple(at, ok); };
+    EXPECT_EQ(indexOf(2), std::tuple(getU32(m.fi, 4 + 16), 1));
+    EXPECT_EQ(indexOf(4), std::tuple(uint32_t(m.ft.size()), 1));
     EXPECT_EQ(messageCount(), 0);
-    EXPECT_EQ(getFTBlockIndex(ftFiles.ftIndexFile, 5, &ok), 0u);
-    EXPECT_EQ(ok, 0);
+    EXPECT_EQ(indexOf(5), std::tuple(0u, 0));
     EXPECT_EQ(lastMessageText(), INDEX_NOT_STORED);
+    EXPECT_EQ(std::tuple(seek(4, 0, 0, &ok), ok), std::tuple(0, 0)) << "reading a block the index does not hold";
+    EXPECT_EQ(lastMessageText(), SEEK_PAST_END);
     closeFTFile(0);
-}
 
-TEST_F(FTBlockIndex, BlockZeroOfAnEmptyIndexIsNotStored) {
+    // Block 0 of an empty index is not stored either.
     song.blockCount = 5;
+    writeFileBytes(fiPath(), {});
     ASSERT_EQ(openFTFile(FT_UPDATE), 1);
-    int ok = 1;
+    clearUiCalls();
     EXPECT_EQ(getFTBlockIndex(ftFiles.ftIndexFile, 0, &ok), 0u);
     EXPECT_EQ(ok, 0);
     EXPECT_EQ(lastMessageText(), INDEX_NOT_STORED);
@@ -341,10 +279,20 @@ TEST_F(FTBlockIndex, BlockZeroOfAnEmptyIndexIsNotStored) {
     closeFTFile(1);
 }
 
-TEST_F(FTBlockIndex, ACountAboveTheSongsIsCutDownOnOpenAndOnClose) {
+TEST_F(FTBlockIndex, ACountAboveTheSongsIsCutDownOnOpenAndOnCloseButNotInAFileOpenForReading) {
     std::vector<TestBlock> blocks = makeBlocks(5);
+    ModelFiles m = modelFiles(blocks);
     storeModel(blocks);
     song.blockCount = 3;
+    ASSERT_EQ(openFTFile(FT_READ), 1);
+    int ok = 0;
+    EXPECT_EQ(getFTBlockIndex(ftFiles.ftIndexFile, 3, &ok), getU32(m.fi, 4 + 24)) << "the end of block 2";
+    EXPECT_EQ(getFTBlockIndex(ftFiles.ftIndexFile, 4, &ok), 0u);
+    EXPECT_EQ(lastMessageText(), INDEX_NOT_STORED);
+    clearUiCalls();
+    EXPECT_EQ(closeFTFile(1), 1);
+    EXPECT_EQ(readFileBytes(fiPath()), m.fi);
+
     ASSERT_EQ(openFTFile(FT_UPDATE), 1);
     EXPECT_EQ(getU32(readFileBytes(fiPath()), 0), 3u);
     song.blockCount = 2;   // a cut while the files are open
@@ -359,22 +307,6 @@ TEST_F(FTBlockIndex, ACountAboveTheSongsIsCutDownOnOpenAndOnClose) {
     EXPECT_EQ(messageCount(), 0);
 }
 
-TEST_F(FTBlockIndex, AnIndexOpenedForReadingIsCappedButNotWritten) {
-    std::vector<TestBlock> blocks = makeBlocks(5);
-    ModelFiles m = modelFiles(blocks);
-    storeModel(blocks);
-    song.blockCount = 3;
-    ASSERT_EQ(openFTFile(FT_READ), 1);
-    int ok = 0;
-    EXPECT_EQ(getFTBlockIndex(ftFiles.ftIndexFile, 3, &ok), getU32(m.fi, 4 + 24)) << "the end of block 2";
-    EXPECT_EQ(getFTBlockIndex(ftFiles.ftIndexFile, 4, &ok), 0u);
-    EXPECT_EQ(lastMessageText(), INDEX_NOT_STORED);
-    clearUiCalls();
-    EXPECT_EQ(closeFTFile(1), 1);
-    EXPECT_EQ(readFileBytes(fiPath()), m.fi);
-    EXPECT_EQ(messageCount(), 0);
-}
-
 TEST_F(FTBlockIndex, AHostileCountIsCappedByTheEntriesTheFileHolds) {
     std::vector<TestBlock> blocks = makeBlocks(2);
     ModelFiles m = modelFiles(blocks);
@@ -385,12 +317,10 @@ TEST_F(FTBlockIndex, AHostileCountIsCappedByTheEntriesTheFileHolds) {
     song.blockCount = 1000;
     ASSERT_EQ(openFTFile(FT_READ), 1);
     int ok = 0;
-    EXPECT_EQ(getFTBlockIndex(ftFiles.ftIndexFile, 2, &ok), uint32_t(m.ft.size()));
-    EXPECT_EQ(ok, 1);
+    EXPECT_EQ(std::tuple(getFTBlockIndex(ftFiles.ftIndexFile, 2, &ok), ok), std::tuple(uint32_t(m.ft.size()), 1));
     EXPECT_EQ(getFTBlockIndex(ftFiles.ftIndexFile, 3, &ok), 0u);
     EXPECT_EQ(lastMessageText(), INDEX_NOT_STORED);
-    EXPECT_EQ(seekToFTBlock(ftFiles.ftFile, ftFiles.ftIndexFile, 2, 0, 0, &ok), 0u);
-    EXPECT_EQ(ok, 0);
+    EXPECT_EQ(std::tuple(seek(2, 0, 0, &ok), ok), std::tuple(0, 0));
     EXPECT_EQ(lastMessageText(), SEEK_PAST_END);
     closeFTFile(1);
 }
@@ -402,11 +332,9 @@ TEST_F(FTBlockIndex, AnEntryReachingPastTheDataFileIsSeekingPastTheEnd) {
     writeFileBytes(ftPath(), std::vector<uint8_t>(m.ft.begin(), m.ft.end() - 1));   // last block one byte short
     ASSERT_EQ(openFTFile(FT_READ), 1);
     int ok = 0;
-    EXPECT_EQ(seekToFTBlock(ftFiles.ftFile, ftFiles.ftIndexFile, 1, 0, 0, &ok), getU32(m.fi, 8 + 8));
-    EXPECT_EQ(ok, 1);
+    EXPECT_EQ(std::tuple(seek(1, 0, 0, &ok), ok), std::tuple(int(getU32(m.fi, 8 + 8)), 1));
     EXPECT_EQ(messageCount(), 0);
-    EXPECT_EQ(seekToFTBlock(ftFiles.ftFile, ftFiles.ftIndexFile, 2, 0, 0, &ok), 0u);
-    EXPECT_EQ(ok, 0);
+    EXPECT_EQ(std::tuple(seek(2, 0, 0, &ok), ok), std::tuple(0, 0));
     EXPECT_EQ(lastMessageText(), SEEK_PAST_END);
     closeFTFile(0);
 
@@ -417,51 +345,34 @@ TEST_F(FTBlockIndex, AnEntryReachingPastTheDataFileIsSeekingPastTheEnd) {
     writeFileBytes(ftPath(), m.ft);
     writeFileBytes(fiPath(), fi);
     ASSERT_EQ(openFTFile(FT_UPDATE), 1);
-    EXPECT_EQ(seekToFTBlock(ftFiles.ftFile, ftFiles.ftIndexFile, 1, 1, 0, &ok), 0u);
+    EXPECT_EQ(seek(1, 1, 0, &ok), 0);
     EXPECT_EQ(ok, 0);
     EXPECT_EQ(lastMessageText(), SEEK_PAST_END);
     clearUiCalls();
-    EXPECT_EQ(seekToFTBlock(ftFiles.ftFile, ftFiles.ftIndexFile, 2, 0, 0, &ok), 0u);
+    EXPECT_EQ(seek(2, 0, 0, &ok), 0);
     EXPECT_EQ(lastMessageText(), SEEK_PAST_END);
     clearUiCalls();
-    EXPECT_EQ(seekToFTBlock(ftFiles.ftFile, ftFiles.ftIndexFile, 3, 1, 0, &ok), 0u) << "appending after block 2";
+    EXPECT_EQ(seek(3, 1, 0, &ok), 0) << "appending after block 2";
     EXPECT_EQ(lastMessageText(), CANNOT_WRITE);
     closeFTFile(0);
 }
 
-TEST_F(FTBlockIndex, ReadingABlockTheIndexDoesNotHoldIsSeekingPastTheEnd) {
-    storeModel(makeBlocks(2));
-    ASSERT_EQ(openFTFile(FT_READ), 1);
-    int ok = 1;
-    EXPECT_EQ(seekToFTBlock(ftFiles.ftFile, ftFiles.ftIndexFile, 2, 0, 0, &ok), 0u);
-    EXPECT_EQ(ok, 0);
-    EXPECT_EQ(lastMessageText(), SEEK_PAST_END);
-    closeFTFile(0);
-}
-
-TEST_F(FTBlockIndex, AnIndexTooShortForItsCountIsRefusedByEveryReader) {
+TEST_F(FTBlockIndex, AnIndexTooShortForItsCountOrMissingIsRefusedByEveryReader) {
     writeFileBytes(ftPath(), std::vector<uint8_t>(12, 0));
     writeFileBytes(fiPath(), {1, 0});
     song.blockCount = 1;
     ASSERT_EQ(openFTFile(FT_UPDATE), 1);
     int ok = 1;
-    EXPECT_EQ(getFTBlockIndex(ftFiles.ftIndexFile, 0, &ok), 0u);
-    EXPECT_EQ(ok, 0);
+    EXPECT_EQ(std::tuple(getFTBlockIndex(ftFiles.ftIndexFile, 0, &ok), ok), std::tuple(0u, 0));
     EXPECT_EQ(lastMessageText(), INDEX_NOT_STORED);
-    EXPECT_EQ(seekToFTBlock(ftFiles.ftFile, ftFiles.ftIndexFile, 0, 1, 1, &ok), 0u);
+    EXPECT_EQ(seek(0, 1, 1, &ok), 0);
     EXPECT_EQ(lastMessageText(), CANNOT_WRITE);
-    EXPECT_EQ(seekToFTBlock(ftFiles.ftFile, ftFiles.ftIndexFile, 0, 0, 0, &ok), 0u);
+    EXPECT_EQ(seek(0, 0, 0, &ok), 0);
     EXPECT_EQ(lastMessageText(), SEEK_PAST_END);
+    EXPECT_EQ(seekToFTBlock(ftFiles.ftFile, nullptr, 0, 0, 0, &ok), 0u);
+    EXPECT_EQ(lastMessageText(), "File handle(s) not valid so cannot seek - seekToFTBlock (1)");
     closeFTFile(1);
     EXPECT_EQ(readFileBytes(fiPath()), (std::vector<uint8_t>{1, 0}));
-}
-
-TEST_F(FTBlockIndex, SeekingWithoutBothFilesIsRefused) {
-    ScratchFile f({});
-    int ok = 1;
-    EXPECT_EQ(seekToFTBlock(f.f, nullptr, 0, 0, 0, &ok), 0u);
-    EXPECT_EQ(ok, 0);
-    EXPECT_EQ(lastMessageText(), "File handle(s) not valid so cannot seek - seekToFTBlock (1)");
 }
 
 TEST_F(FTBlockIndex, ABlockSizeIsWrittenOnlyIntoAStoredEntry) {
@@ -473,60 +384,46 @@ TEST_F(FTBlockIndex, ABlockSizeIsWrittenOnlyIntoAStoredEntry) {
     EXPECT_EQ(setFTBlockSize(ftFiles.ftIndexFile, 3, 99), 0);
     closeFTFile(1);
     std::vector<uint8_t> expected = m.fi;
-    expected[16] = 4;
-    expected[17] = 3;
-    expected[18] = 2;
-    expected[19] = 1;
+    for (int i = 0; i < 4; i++) expected[16 + i] = uint8_t(4 - i);
     EXPECT_EQ(readFileBytes(fiPath()), expected);
 }
 
 // ---- opening and closing ----
 
-TEST_F(FTBlockFiles, AnUpdateOpenCreatesBothFilesEmpty) {
+TEST_F(FTBlockFiles, AnUpdateOpenCreatesBothFilesEmptyAndASecondOpenIsRefused) {
     ASSERT_EQ(openFTFile(FT_UPDATE), 1);
     EXPECT_EQ(ftFilesOpen(), 1);
-    EXPECT_TRUE(fileExists(ftPath()));
-    EXPECT_TRUE(fileExists(fiPath()));
-    EXPECT_EQ(closeFTFile(1), 1);
-    EXPECT_EQ(ftFilesOpen(), 0);
-    EXPECT_EQ(ftFiles.ftFile, nullptr);
-    EXPECT_EQ(ftFiles.ftIndexFile, nullptr);
-    EXPECT_EQ(fileSize(ftPath()), 0);
-    EXPECT_EQ(fileSize(fiPath()), 0);
-    EXPECT_EQ(closeFTFile(1), 1) << "closing with nothing open does nothing";
-}
-
-TEST_F(FTBlockFiles, OpeningTwiceIsRefusedAndKeepsTheOpenFiles) {
-    ASSERT_EQ(openFTFile(FT_UPDATE), 1);
     FILE* open = ftFiles.ftFile;
     EXPECT_EQ(openFTFile(FT_READ), 0);
     EXPECT_EQ(lastMessageText(), "FT File(s) already open - openFTFile (1)");
     EXPECT_EQ(ftFiles.ftFile, open);
-    closeFTFile(1);
+    EXPECT_EQ(closeFTFile(1), 1);
+    EXPECT_EQ(std::tuple(ftFilesOpen(), ftFiles.ftFile, ftFiles.ftIndexFile), std::tuple(0, nullptr, nullptr));
+    EXPECT_EQ(std::tuple(fileSize(ftPath()), fileSize(fiPath())), std::tuple(0, 0));
+    EXPECT_EQ(closeFTFile(1), 1) << "closing with nothing open does nothing";
 }
 
-TEST_F(FTBlockFiles, ReadingAMissingFTFileFails) {
-    EXPECT_EQ(openFTFile(FT_READ), 0);
-    EXPECT_EQ(lastMessageText(), "Could not open FT file - openFTFile (2)");
-    EXPECT_EQ(ftFilesOpen(), 0);
-    EXPECT_FALSE(fileExists(ftPath())) << "reading creates nothing";
-}
-
-TEST_F(FTBlockFiles, AnFTFileThatCannotBeOpenedLeavesNothingOpen) {
-    storeModel(makeBlocks(2));
-    failFileCall(FILE_OP_OPEN, 1);
-    EXPECT_EQ(openFTFile(FT_UPDATE), 0);
-    EXPECT_EQ(lastMessageText(), "Could not open FT file - openFTFile (2)");
-    EXPECT_EQ(messageCount(), 1);
-    EXPECT_EQ(ftFilesOpen(), 0);
-}
-
-TEST_F(FTBlockFiles, AnIndexThatCannotBeOpenedClosesTheFTFileAgain) {
-    storeModel(makeBlocks(2));
-    failFileCall(FILE_OP_OPEN, 2);
-    EXPECT_EQ(openFTFile(FT_READ), 0);
-    EXPECT_EQ(lastMessageText(), "Could not open FT index file - openFTFile (3)");
-    EXPECT_EQ(ftFilesOpen(), 0);
+TEST_F(FTBlockFiles, AFileThatCannotBeOpenedLeavesNothingOpen) {
+    struct Case {
+        bool stored;     // CS.ft and CS.fi exist
+        int failingOpen;
+        int mode;
+        const char* text;
+    } cases[] = {
+        {false, 0, FT_READ, "Could not open FT file - openFTFile (2)"},
+        {true, 1, FT_UPDATE, "Could not open FT file - openFTFile (2)"},
+        {true, 2, FT_READ, "Could not open FT index file - openFTFile (3)"},
+    };
+    for (const Case& c : cases) {
+        if (c.stored) storeModel(makeBlocks(2));
+        clearUiCalls();
+        failFileCall(FILE_OP_OPEN, c.failingOpen);
+        EXPECT_EQ(openFTFile(c.mode), 0);
+        EXPECT_EQ(lastMessageText(), c.text);
+        EXPECT_EQ(messageCount(), 1);
+        EXPECT_EQ(ftFilesOpen(), 0);
+        EXPECT_EQ(fileExists(ftPath()), c.stored) << "reading creates nothing";
+    }
     EXPECT_EQ(openFTFile(FT_READ), 1) << "nothing is left open to refuse the next open";
     closeFTFile(0);
 }

@@ -5,6 +5,7 @@
 
 #include <cerrno>
 #include <cstring>
+#include <tuple>
 
 #include "store/ftBlockStoreFixtures.h"
 
@@ -80,19 +81,15 @@ TEST_F(FTBlockWindowLoad, ARangeInsideTheWindowReadsNothing) {
     ASSERT_EQ(loadFTBlockWindow(5, 6), 1);
     // Every count in CS.ft now reads as corrupt: any read would fail with a message.
     writeFileBytes(ftPath(), std::vector<uint8_t>(readFileBytes(ftPath()).size(), 0xFF));
-    EXPECT_EQ(loadFTBlockWindow(5, 20), 0);
-    EXPECT_EQ(loadFTBlockWindow(12, 14), 0);
-    EXPECT_EQ(loadFTBlockWindow(19, 19), 0);
-    EXPECT_EQ(messageCount(), 0);
-    EXPECT_EQ(ftBlockWindow.firstBlock, 5u);
-    EXPECT_EQ(ftBlockWindow.endBlock, 20u);
+    EXPECT_EQ((std::vector<int>{loadFTBlockWindow(5, 20), loadFTBlockWindow(12, 14), loadFTBlockWindow(19, 19)}), std::vector<int>(3, 0));
+    EXPECT_EQ(std::tuple(messageCount(), ftBlockWindow.firstBlock, ftBlockWindow.endBlock), std::tuple(0, 5u, 20u));
     expectWindowMatches(all);
     // The same files do fail a load that has to read.
     EXPECT_EQ(loadFTBlockWindow(4, 5), 0);
     EXPECT_EQ(lastMessageText(), "dataBuffer->nEntries is corrupt so cannot read FT block - readFTBlock (3)");
 }
 
-TEST_F(FTBlockWindowLoad, ZeroZeroReloadsTheWindowAndDiscardsChangesInIt) {
+TEST_F(FTBlockWindowLoad, ZeroZeroReloadsTheWindowDiscardingChangesOrLoadsAnEmptyOneFromTheStart) {
     std::vector<TestBlock> all = makeBlocks(40);
     storeModel(all);
     ASSERT_EQ(loadFTBlockWindow(5, 6), 1);
@@ -102,11 +99,12 @@ TEST_F(FTBlockWindowLoad, ZeroZeroReloadsTheWindowAndDiscardsChangesInIt) {
     EXPECT_EQ(ftBlockWindow.firstBlock, 5u);
     EXPECT_EQ(ftBlockWindow.endBlock, 20u);
     expectWindowMatches(all);
-}
-
-TEST_F(FTBlockWindowLoad, ZeroZeroOnAnEmptyWindowLoadsFromTheFirstBlock) {
-    std::vector<TestBlock> all = makeBlocks(20);
-    storeModel(all);
+    freeFTBlockWindow();
+    EXPECT_TRUE(ftBlockWindow.dataBuffers.empty() && ftBlockWindow.origDataBuffers.empty() &&
+                ftBlockWindow.detectedFrequenciesBuffers.empty());
+    EXPECT_EQ(ftBlockWindow.endBlock, 0u);
+    EXPECT_EQ(ftBlockWindow.capacity, 0u);
+    setFTBlockWindowCapacity(BLOCK_SECONDS);
     EXPECT_EQ(loadFTBlockWindow(0, 0), 1);
     EXPECT_EQ(ftBlockWindow.firstBlock, 0u);
     EXPECT_EQ(ftBlockWindow.endBlock, CAPACITY);
@@ -184,7 +182,7 @@ TEST_F(FTBlockWindowLoad, ACorruptBlockEndsTheWindowBeforeIt) {
 
 TEST_F(FTBlockWindowLoad, AWindowThatCannotGetItsMemoryShowsTheMemoryMessage) {
     storeModel(makeBlocks(20));
-    failFTAllocation(1);
+    failAllocation(1);
     EXPECT_EQ(loadFTBlockWindow(0, 1), 0);
     EXPECT_EQ(lastMessageText(),
               std::string("Sorry - there is insufficient memory available to continue. Please try freeing up some "
@@ -208,18 +206,6 @@ TEST_F(FTBlockWindowLoad, AFailedOpenLeavesTheWindowAsItWas) {
     EXPECT_EQ(ftBlockWindow.firstBlock, 0u);
     EXPECT_EQ(ftBlockWindow.endBlock, CAPACITY);
     expectWindowMatches(all);
-}
-
-TEST_F(FTBlockWindowLoad, FreeingTheWindowEmptiesIt) {
-    storeModel(makeBlocks(20));
-    ASSERT_EQ(loadFTBlockWindow(0, 1), 1);
-    freeFTBlockWindow();
-    EXPECT_TRUE(ftBlockWindow.dataBuffers.empty());
-    EXPECT_TRUE(ftBlockWindow.origDataBuffers.empty());
-    EXPECT_TRUE(ftBlockWindow.detectedFrequenciesBuffers.empty());
-    EXPECT_EQ(ftBlockWindow.firstBlock, 0u);
-    EXPECT_EQ(ftBlockWindow.endBlock, 0u);
-    EXPECT_EQ(ftBlockWindow.capacity, 0u);
 }
 
 // ---- writing window blocks back ----
@@ -310,8 +296,12 @@ TEST_F(FTBlockRewrite, RewritingABlockDropsTheLaterOnesUntilTheyAreWrittenAgain)
     storeModel(all);
     all[4] = makeBlock(90, 200, 200, 15);   // recognition rebuilt block 4: larger
     all[5] = makeBlock(91, 0, 0, 0);        // and block 5: smaller
-    putInWindow(all, 0);
+    putInWindow(std::vector<TestBlock>(all.begin(), all.begin() + 8), 0);
     ASSERT_EQ(openFTFile(FT_UPDATE), 1);
+    EXPECT_EQ(rewriteFTBlocks(ftFiles.ftFile, ftFiles.ftIndexFile, 9, 10), 0);
+    EXPECT_EQ(lastMessageText(), "Block to write not in memory so cannot write data - writeFTBlock (2)");
+    EXPECT_EQ(readFileBytes(fiPath()), modelFiles(makeBlocks(12)).fi) << "a block outside the window leaves the index";
+    putInWindow(all, 0);
     EXPECT_EQ(rewriteFTBlocks(ftFiles.ftFile, ftFiles.ftIndexFile, 4, 6), 1);
     ASSERT_EQ(closeFTFile(1), 1);
     std::vector<uint8_t> fi = readFileBytes(fiPath());
@@ -322,17 +312,6 @@ TEST_F(FTBlockRewrite, RewritingABlockDropsTheLaterOnesUntilTheyAreWrittenAgain)
     ModelFiles m = modelFiles(all);
     EXPECT_EQ(readFileBytes(fiPath()), m.fi);
     EXPECT_EQ(readFileBytes(ftPath()), m.ft);
-}
-
-TEST_F(FTBlockRewrite, ABlockOutsideTheWindowLeavesTheIndexAlone) {
-    std::vector<TestBlock> all = makeBlocks(12);
-    storeModel(all);
-    putInWindow(std::vector<TestBlock>(all.begin(), all.begin() + 8), 0);
-    ASSERT_EQ(openFTFile(FT_UPDATE), 1);
-    EXPECT_EQ(rewriteFTBlocks(ftFiles.ftFile, ftFiles.ftIndexFile, 9, 10), 0);
-    EXPECT_EQ(lastMessageText(), "Block to write not in memory so cannot write data - writeFTBlock (2)");
-    closeFTFile(1);
-    EXPECT_EQ(readFileBytes(fiPath()), modelFiles(all).fi);
 }
 
 // ---- cutting blocks ----
@@ -356,56 +335,35 @@ TEST_F(FTBlockRemove, CutsAtTheStartInTheMiddleAndAtTheEndLeaveExactlyTheOtherBl
     }
 }
 
-TEST_F(FTBlockRemove, ACutPastTheStoredBlocksIsRefusedAndChangesNothing) {
-    std::vector<TestBlock> all = makeBlocks(10);
-    storeModel(all);
-    EXPECT_EQ(removeFTBlocksFromSong(8, 3), 0);
-    EXPECT_EQ(lastMessageText(), "Index for FT block is not stored - getFTBlockIndex (1).");
-    EXPECT_EQ(ftFilesOpen(), 0);
-    ModelFiles m = modelFiles(all);
-    EXPECT_EQ(readFileBytes(ftPath()), m.ft);
-    EXPECT_EQ(readFileBytes(fiPath()), m.fi);
-}
-
-TEST_F(FTBlockRemove, ATemporaryFileThatCannotBeMadeChangesNothing) {
-    std::vector<TestBlock> all = makeBlocks(10);
-    storeModel(all);
-    failFileCall(FILE_OP_OPEN, 3);   // CS.ft, CS.fi, then CS.tw
-    EXPECT_EQ(removeFTBlocksFromSong(2, 3), 0);
-    EXPECT_EQ(lastMessageText(), "Cannot " + sharedFilePath("CS.tw"));
-    EXPECT_EQ(ftFilesOpen(), 0);
-    ModelFiles m = modelFiles(all);
-    EXPECT_EQ(readFileBytes(ftPath()), m.ft);
-    EXPECT_EQ(readFileBytes(fiPath()), m.fi);
-}
-
-TEST_F(FTBlockRemove, ACorruptBlockBehindTheCutStopsItBeforeAnythingMoves) {
-    std::vector<TestBlock> all = makeBlocks(10);
-    ModelFiles m = modelFiles(all);
-    uint32_t block7 = getU32(m.fi, 4 + 8 * 7);
-    m.ft[block7 + 1] = 0x01;   // dataBuffer count of block 7: 256 or more
-    writeFileBytes(ftPath(), m.ft);
-    writeFileBytes(fiPath(), m.fi);
-    song.blockCount = 10;
-    EXPECT_EQ(removeFTBlocksFromSong(2, 3), 0);
-    EXPECT_EQ(lastMessageText(), "dataBuffer->nEntries is corrupt so cannot read FT block - readFTBlock (3)");
-    EXPECT_EQ(readFileBytes(ftPath()), m.ft);
-    EXPECT_EQ(readFileBytes(fiPath()), m.fi);
-    EXPECT_FALSE(fileExists(sharedFilePath("CS.tw")));
-    EXPECT_EQ(ftFilesOpen(), 0);
-}
-
-TEST_F(FTBlockRemove, AnIndexPointingPastTheDataIsRefused) {
-    std::vector<TestBlock> all = makeBlocks(10);
-    ModelFiles m = modelFiles(all);
-    m.fi[4 + 8 * 5 + 3] = 0x40;   // block 5 "starts" a gigabyte in
-    writeFileBytes(ftPath(), m.ft);
-    writeFileBytes(fiPath(), m.fi);
-    song.blockCount = 10;
-    EXPECT_EQ(removeFTBlocksFromSong(2, 3), 0);
-    EXPECT_EQ(lastMessageText(), SEEK_PAST_END);
-    EXPECT_EQ(readFileBytes(ftPath()), m.ft);
-    EXPECT_EQ(readFileBytes(fiPath()), m.fi);
+TEST_F(FTBlockRemove, ARefusedCutChangesNothing) {
+    ModelFiles m = modelFiles(makeBlocks(10));
+    ModelFiles corrupt = m;
+    corrupt.ft[getU32(m.fi, 4 + 8 * 7) + 1] = 0x01;   // dataBuffer count of block 7: 256 or more
+    ModelFiles pastTheData = m;
+    pastTheData.fi[4 + 8 * 5 + 3] = 0x40;           // block 5 "starts" a gigabyte in
+    struct Case {
+        const ModelFiles& files;
+        uint32_t first, count;
+        int failingOpen;
+        std::string text;
+    } cases[] = {
+        {m, 8, 3, 0, "Index for FT block is not stored - getFTBlockIndex (1)."},
+        {m, 2, 3, 3, "Cannot " + sharedFilePath("CS.tw")},   // CS.ft, CS.fi, then CS.tw
+        {corrupt, 2, 3, 0, "dataBuffer->nEntries is corrupt so cannot read FT block - readFTBlock (3)"},
+        {pastTheData, 2, 3, 0, SEEK_PAST_END},
+    };
+    for (const Case& c : cases) {
+        writeFileBytes(ftPath(), c.files.ft);
+        writeFileBytes(fiPath(), c.files.fi);
+        song.blockCount = 10;
+        failFileCall(FILE_OP_OPEN, c.failingOpen);
+        EXPECT_EQ(removeFTBlocksFromSong(c.first, c.count), 0);
+        EXPECT_EQ(lastMessageText(), c.text);
+        EXPECT_EQ(readFileBytes(ftPath()), c.files.ft) << c.text;
+        EXPECT_EQ(readFileBytes(fiPath()), c.files.fi) << c.text;
+        EXPECT_FALSE(fileExists(sharedFilePath("CS.tw")));
+        EXPECT_EQ(ftFilesOpen(), 0);
+    }
 }
 
 }  // namespace

@@ -9,6 +9,7 @@
 #include <string>
 #include <vector>
 
+#include "platform/allocation.h"
 #include "platform/files.h"
 #include "platform/ui.h"
 #include "shell/paths.h"
@@ -54,21 +55,14 @@ struct Spectrum {
     double at(uint32_t i) const { return bins[2 * size_t(i)]; }
 };
 
-class HiresFTFixture : public ::testing::Test {
+class HiresFTFixture : public SharedFolderTest {
 protected:
     void SetUp() override {
-        // The store's files go to this test's own shared folder; the run's is put back after.
-        savedPaths = paths;
-        setSharedBasePath(folder.path());
-        makeFolder(paths.sharedFolder);
+        SharedFolderTest::SetUp();
         resetSong();
         song.waveFormat.bitsPerSample = 16;
         hiresGeometry = HiresGeometry{N, F, M, 0.03125};
         generalSettings.disableWaveEditing = false;
-        clearUiCalls();
-        clearFileFailures();
-        failHiresAllocation(0);
-        removeStoreFiles();
         scratchPath = folder.file("block");
         scratch = fileOpen(scratchPath, "wb+");
         ASSERT_NE(scratch, nullptr);
@@ -81,16 +75,10 @@ protected:
         closeHiresFTFile(0);
         freeHiresBuffers();
         freeFTBlockWindow();
-        removeStoreFiles();
-        clearFileFailures();
-        failHiresAllocation(0);
         generalSettings = GeneralSettings{};
         hiresGeometry = HiresGeometry{};
         resetSong();
-        paths = savedPaths;
-    }
-    static void removeStoreFiles() {
-        for (const char* name : {"CS.ft+", "CS.fi+", "CS.tw"}) fileDelete(sharedFilePath(name));
+        SharedFolderTest::TearDown();
     }
     // Compresses spectrum into the scratch file (replacing what it held); the bytes written.
     uint32_t writeScratch(const Spectrum& spectrum, float offset = 0.0f, const float* deviations = nullptr) {
@@ -116,8 +104,6 @@ protected:
         return readHiresFTBlock(scratch, 0, 0, out.bins.data(), deviations);
     }
 
-    TempFolder folder;
-    Paths savedPaths;
     std::string scratchPath;
     FILE* scratch = nullptr;
     CompressedHiresBuffer* buffer = nullptr;
@@ -235,12 +221,9 @@ protected:
     }
 };
 
-TEST_F(HiresFTThreshold, SixteenBitKeepsEveryBinFrom32768AndClearsTheRest) {
+TEST_F(HiresFTThreshold, SixteenBitKeepsEveryBinFrom32768AndEightBitFromOneHalfAndClearsTheRest) {
     song.waveFormat.bitsPerSample = 16;
     checkRoundTrip(32768.0);
-}
-
-TEST_F(HiresFTThreshold, EightBitKeepsEveryBinFromOneHalfAndClearsTheRest) {
     song.waveFormat.bitsPerSample = 8;
     checkRoundTrip(0.5);
 }
@@ -255,11 +238,9 @@ TEST_F(HiresFTRoundTrip, DeviationsFollowTheOffsetFromEachBinsCentre) {
     Spectrum out;
     std::vector<float> deviations(N, 9.0f);
     ASSERT_GT(readScratch(out, deviations.data()), 0u);
-    EXPECT_NEAR(deviations[0], 500.0, tolerance);
-    EXPECT_NEAR(deviations[75], 750.0, tolerance);
-    EXPECT_NEAR(deviations[150], 1000.0, tolerance);
-    EXPECT_EQ(deviations[1], 0.0f) << "a bin that is not stored has no deviation";
-    EXPECT_EQ(deviations[599], 0.0f);
+    for (auto [bin, deviation] : {std::pair(0, 500.0), std::pair(75, 750.0), std::pair(150, 1000.0)})
+        EXPECT_NEAR(deviations[bin], deviation, tolerance) << bin;
+    EXPECT_EQ(std::pair(deviations[1], deviations[599]), std::pair(0.0f, 0.0f)) << "a bin not stored has no deviation";
 
     ASSERT_GT(writeScratch(s, float(std::log(0.5))), 0u);   // an octave down
     ASSERT_GT(readScratch(out, deviations.data()), 0u);
@@ -304,17 +285,33 @@ TEST_F(HiresFTRoundTrip, WhenEveryBinLiesBelow5000HzTheLastIsLeftOutSoTheBlockSt
 
 class HiresFTCorruptBlocks : public HiresFTFixture {};
 
-TEST_F(HiresFTCorruptBlocks, ACountOfNIsRefusedAndNMinus1IsRead) {
-    Bytes atN = storedBlock(uint16_t(N), 1.0f, 0.0f, std::vector<uint16_t>(N, 1), Bytes(N, 0));
-    craftScratch(atN);
-    Spectrum out;
-    EXPECT_EQ(readScratch(out), 0u);
-    EXPECT_EQ(lastMessageText(), CORRUPT_TEXT);
-    std::rewind(scratch);
-    EXPECT_EQ(readCompressedHiresBlock(scratch, buffer), 0u);
+// A count of N or more, a block cut short, a scale or offset that is not a number or infinite,
+// or a negative scale: the block is refused with the bins it would have filled cleared.
+TEST_F(HiresFTCorruptBlocks, ADamagedHeadOrABlockCutShortIsRefusedWithBinsCleared) {
+    const float nan = std::numeric_limits<float>::quiet_NaN();
+    const float inf = std::numeric_limits<float>::infinity();
+    Bytes whole = storedBlock(4, 1.0f, 0.0f, {1, 2, 3, 4}, {3, 0, 0, 0});
+    std::vector<Bytes> damaged = {storedBlock(uint16_t(N), 1.0f, 0.0f, std::vector<uint16_t>(N, 1), Bytes(N, 0))};
+    for (size_t length : {size_t(0), size_t(5), size_t(10), size_t(17), whole.size() - 1})
+        damaged.emplace_back(whole.begin(), whole.begin() + long(length));
+    for (auto [scale, offset] : {std::pair{nan, 0.0f}, {inf, 0.0f}, {-1.0f, 0.0f}, {1.0f, nan}, {1.0f, -inf}})
+        damaged.push_back(storedBlock(1, scale, offset, {100}, {3}));
+    for (const Bytes& bytes : damaged) {
+        clearUiCalls();
+        craftScratch(bytes);
+        Spectrum out;
+        out.set(3, 5.0);
+        std::vector<float> deviations(N, 0.0f);
+        EXPECT_EQ(readScratch(out, deviations.data()), 0u) << bytes.size() << " bytes";
+        EXPECT_EQ(lastMessageText(), CORRUPT_TEXT);
+        EXPECT_EQ(out.at(3), 0.0);
+        std::rewind(scratch);
+        EXPECT_EQ(readCompressedHiresBlock(scratch, buffer), 0u);
+    }
     EXPECT_EQ(buffer->count, 0);
-
+    // N - 1 entries are the most a block holds.
     clearUiCalls();
+    Spectrum out;
     craftScratch(storedBlock(uint16_t(N - 1), 1.0f, 0.0f, std::vector<uint16_t>(N - 1, 65535), Bytes(N - 1, 0)));
     EXPECT_EQ(readScratch(out), 10u + 3 * (N - 1));
     EXPECT_NEAR(out.at(N - 2), std::exp(1.0) - 1, 1e-12);
@@ -334,38 +331,6 @@ TEST_F(HiresFTCorruptBlocks, EntriesWhoseGapsRunPastTheLastBinAreIgnored) {
     EXPECT_EQ(destination[2 * bins], 7.0) << "the entry for bin 712 lies past N and must be dropped";
     EXPECT_EQ(destination[2 * bins + 1], 7.0);
     EXPECT_EQ(deviations[bins], 7.0f);
-}
-
-TEST_F(HiresFTCorruptBlocks, ABlockCutShortIsRefusedWithBinsCleared) {
-    Bytes whole = storedBlock(4, 1.0f, 0.0f, {1, 2, 3, 4}, {0, 0, 0, 0});
-    for (size_t length : {size_t(0), size_t(5), size_t(10), size_t(17), whole.size() - 1}) {
-        clearUiCalls();
-        craftScratch(Bytes(whole.begin(), whole.begin() + long(length)));
-        Spectrum out;
-        out.set(0, 5.0);
-        EXPECT_EQ(readScratch(out), 0u) << length << " bytes";
-        EXPECT_EQ(lastMessageText(), CORRUPT_TEXT);
-        EXPECT_EQ(out.at(0), 0.0);
-        std::rewind(scratch);
-        EXPECT_EQ(readCompressedHiresBlock(scratch, buffer), 0u);
-    }
-}
-
-TEST_F(HiresFTCorruptBlocks, ANaNOrInfiniteScaleOrOffsetOrANegativeScaleIsCorrupt) {
-    const float nan = std::numeric_limits<float>::quiet_NaN();
-    const float inf = std::numeric_limits<float>::infinity();
-    const float heads[][2] = {{nan, 0.0f}, {inf, 0.0f}, {-1.0f, 0.0f}, {1.0f, nan}, {1.0f, -inf}};
-    for (const auto& head : heads) {
-        clearUiCalls();
-        craftScratch(storedBlock(1, head[0], head[1], {100}, {3}));
-        Spectrum out;
-        std::vector<float> deviations(N, 0.0f);
-        EXPECT_EQ(readScratch(out, deviations.data()), 0u) << head[0] << " " << head[1];
-        EXPECT_EQ(lastMessageText(), CORRUPT_TEXT);
-        EXPECT_EQ(out.at(3), 0.0);
-        std::rewind(scratch);
-        EXPECT_EQ(readCompressedHiresBlock(scratch, buffer), 0u);
-    }
 }
 
 TEST_F(HiresFTCorruptBlocks, AHugeScaleGivesLargeButFiniteMagnitudes) {
@@ -403,17 +368,17 @@ class HiresFTMessages : public HiresFTFixture {};
 
 TEST_F(HiresFTMessages, MissingFilesAreRefused) {
     Spectrum s;
+    const char* cannotRead = "File handle not valid so cannot read data - readHiresFTBlock (1)";
+    const char* cannotWrite = "File handle not valid so cannot write data - writeHiresFTBlock (1)";
     EXPECT_EQ(readHiresFTBlock(nullptr, 0, 0, s.bins.data(), nullptr), 0u);
-    EXPECT_EQ(lastMessageText(), "File handle not valid so cannot read data - readHiresFTBlock (1)");
-    clearUiCalls();
-    EXPECT_EQ(readCompressedHiresBlock(nullptr, buffer), 0u);
-    EXPECT_EQ(lastMessageText(), "File handle not valid so cannot read data - readHiresFTBlock (1)");
-    clearUiCalls();
+    EXPECT_EQ(lastMessageText(), cannotRead);
     EXPECT_EQ(writeHiresFTBlock(nullptr, 0, 0, buffer, s.bins.data(), nullptr), 0u);
-    EXPECT_EQ(lastMessageText(), "File handle not valid so cannot write data - writeHiresFTBlock (1)");
-    clearUiCalls();
+    EXPECT_EQ(lastMessageText(), cannotWrite);
+    EXPECT_EQ(readCompressedHiresBlock(nullptr, buffer), 0u);
+    EXPECT_EQ(lastMessageText(), cannotRead);
     EXPECT_EQ(writeCompressedHiresBlock(nullptr, buffer), 0u);
-    EXPECT_EQ(lastMessageText(), "File handle not valid so cannot write data - writeHiresFTBlock (1)");
+    EXPECT_EQ(lastMessageText(), cannotWrite);
+    EXPECT_EQ(messageCount(), 4);
 }
 
 TEST_F(HiresFTMessages, BlocksOutsideTheWindowAreNotInMemory) {
@@ -439,12 +404,12 @@ TEST_F(HiresFTMessages, BlocksOutsideTheWindowAreNotInMemory) {
 }
 
 TEST_F(HiresFTMessages, AllocationFailuresNameTheRecordOrTheArrays) {
-    failHiresAllocation(1);
+    failAllocation(1);
     EXPECT_EQ(allocCompressedHiresBuffer(0), nullptr);
     EXPECT_EQ(lastMessageText(), "Could not allocate compressed hires buffer - allocCompressedHiresBuffer (1)");
     for (int array = 2; array <= 4; array++) {
         clearUiCalls();
-        failHiresAllocation(array);
+        failAllocation(array);
         EXPECT_EQ(allocCompressedHiresBuffer(0), nullptr);
         EXPECT_EQ(lastMessageText(), "Could not allocate compressed hires buffer - allocCompressedHiresBuffer (2)");
     }
@@ -452,7 +417,7 @@ TEST_F(HiresFTMessages, AllocationFailuresNameTheRecordOrTheArrays) {
     ftBlockWindow.endBlock = 2;
     ftBlockWindow.capacity = 2;
     craftScratch(storedBlock(0, 1.0f, 0.0f, {}, {}));
-    failHiresAllocation(1);
+    failAllocation(1);
     EXPECT_EQ(readHiresFTBlock(scratch, 0, 1, nullptr, nullptr), 0u);
     EXPECT_EQ(lastMessageText(), "Could not allocate Hires buffer - allocHiresBuffer (1)");
 }
@@ -527,20 +492,29 @@ TEST_F(HiresFTFiles, TheAnalysisStoreLaysBlocksOutOneAfterAnother) {
         EXPECT_EQ(getU16(blocks[b], 0), b + 1 + forced);
     }
     expectFilesHold(blocks);
-}
-
-TEST_F(HiresFTFiles, WithWaveEditingDisabledNothingIsWritten) {
-    fillWindow(3);
+    // Read back through the index, the blocks give the window's spectra.
+    ASSERT_EQ(openHiresFTFile(FT_READ), 1);
+    int ok = 0;
+    seekToFTBlock(hiresFiles.hiresFile, hiresFiles.hiresIndexFile, 2, 0, 0, &ok);
+    ASSERT_EQ(ok, 1);
+    Spectrum block2, block3;
+    EXPECT_GT(readHiresFTBlock(hiresFiles.hiresFile, 0, 2, block2.bins.data(), nullptr), 0u);
+    EXPECT_GT(readHiresFTBlock(hiresFiles.hiresFile, 0, 3, block3.bins.data(), nullptr), 0u);
+    EXPECT_NEAR(block2.at(2 + 6), 42000.0, 42000.0 * 1e-3);
+    EXPECT_EQ(block2.at(2 + 7), 0.0);
+    EXPECT_NEAR(block3.at(3 + 9), 43000.0, 43000.0 * 1e-3);
+    ASSERT_EQ(closeHiresFTFile(0), 1);
+    // With wave editing disabled nothing is written.
+    writeFileBytes(sharedFilePath("CS.ft+"), {});
+    writeFileBytes(sharedFilePath("CS.fi+"), {});
     generalSettings.disableWaveEditing = true;
-    ASSERT_EQ(openHiresFTFile(FT_UPDATE), 1);
-    EXPECT_EQ(writeHiresFTBlocks(hiresFiles.hiresFile, hiresFiles.hiresIndexFile, 0, 3), 1);
-    ASSERT_EQ(closeHiresFTFile(1), 1);
+    storeWindow(5);
     EXPECT_TRUE(dataBytes().empty());
     EXPECT_TRUE(indexBytes().empty());
     EXPECT_EQ(messageCount(), 0);
 }
 
-TEST_F(HiresFTFiles, ARewriteInPlaceOfAnotherSizeIsRefusedBeforeAnythingIsWritten) {
+TEST_F(HiresFTFiles, ARewriteInPlaceMustKeepTheBlocksSize) {
     fillWindow(3);
     storeWindow(3);
     Bytes data = dataBytes(), index = indexBytes();
@@ -553,12 +527,10 @@ TEST_F(HiresFTFiles, ARewriteInPlaceOfAnotherSizeIsRefusedBeforeAnythingIsWritte
     EXPECT_FALSE(hiresFilesOpen()) << "both files are closed after the message";
     EXPECT_EQ(dataBytes(), data);
     EXPECT_EQ(indexBytes(), index);
-}
-
-TEST_F(HiresFTFiles, ARewriteInPlaceOfTheSameSizeChangesOnlyThatBlock) {
-    fillWindow(3);
-    storeWindow(3);
+    // Of the same size, a rewrite in place changes only that block.
     std::vector<Bytes> before = storedBlocks();
+    hiresBuffer.bins[(size_t(1) * N + 100) * 2] = 0.0;
+    hiresBuffer.bins[(size_t(1) * N + 200) * 2] = 0.0;
     hiresBuffer.bins[(size_t(1) * N + 1) * 2] = 1e9;   // louder, same bins stored
     ASSERT_EQ(openHiresFTFile(FT_UPDATE), 1);
     EXPECT_EQ(storeHiresFTBlock(hiresFiles.hiresFile, hiresFiles.hiresIndexFile, 0, buffer, 1, 0), before[1].size());
@@ -596,21 +568,6 @@ TEST_F(HiresFTFiles, OpeningTwiceOrWithoutFilesIsRefused) {
     EXPECT_EQ(lastMessageText(), "Could not open Hires FT index file - openHiresFTFile (3)");
 }
 
-TEST_F(HiresFTFiles, ReadingBackThroughTheIndexGivesTheWindowsSpectra) {
-    fillWindow(4);
-    storeWindow(4);
-    ASSERT_EQ(openHiresFTFile(FT_READ), 1);
-    int ok = 0;
-    seekToFTBlock(hiresFiles.hiresFile, hiresFiles.hiresIndexFile, 2, 0, 0, &ok);
-    ASSERT_EQ(ok, 1);
-    Spectrum block2, block3;
-    EXPECT_GT(readHiresFTBlock(hiresFiles.hiresFile, 0, 2, block2.bins.data(), nullptr), 0u);
-    EXPECT_GT(readHiresFTBlock(hiresFiles.hiresFile, 0, 3, block3.bins.data(), nullptr), 0u);
-    EXPECT_NEAR(block2.at(2 + 6), 42000.0, 42000.0 * 1e-3);
-    EXPECT_EQ(block2.at(2 + 7), 0.0);
-    EXPECT_NEAR(block3.at(3 + 9), 43000.0, 43000.0 * 1e-3);
-}
-
 // ---- cutting blocks ----
 
 class HiresFTRemove : public HiresFTFiles {};
@@ -636,61 +593,45 @@ TEST_F(HiresFTRemove, CuttingBlocksFromTheMiddleFromTheStartAndAtTheEndMatchesTh
     EXPECT_EQ(model.size(), 2u);
 }
 
-TEST_F(HiresFTRemove, AFailedCopyOfTheTailLeavesTheFilesAsTheyWere) {
+// A failed copy of the tail, a damaged block in it, a cut past the stored blocks or an index
+// entry past the data or running backwards: the cut is refused and the files stay as they were.
+TEST_F(HiresFTRemove, ARefusedCutLeavesTheFilesAsTheyWere) {
     fillWindow(6);
     storeWindow(6);
-    Bytes data = dataBytes(), index = indexBytes();
-    failFileCall(FILE_OP_WRITE, 1);   // the first write into CS.tw
-    EXPECT_EQ(removeHiresFTBlocksFromSong(1, 2), 0);
-    EXPECT_EQ(lastMessageText(),
-              "bytesWritten does not equal bytesRead - removeHiresFTBlocksFromSong (1). Data may be corrupted.");
-    EXPECT_EQ(dataBytes(), data);
-    EXPECT_EQ(indexBytes(), index);
-    EXPECT_FALSE(fileExists(sharedFilePath("CS.tw")));
-    EXPECT_FALSE(hiresFilesOpen());
-}
-
-TEST_F(HiresFTRemove, ADamagedBlockInTheTailStopsTheCutBeforeAnythingMoves) {
-    fillWindow(6);
-    storeWindow(6);
-    Bytes data = dataBytes();
-    std::vector<Bytes> blocks = storedBlocks();
-    size_t block4 = getU32(indexBytes(), 4 + 8 * 4);
-    data[block4] = uint8_t(N & 0xFF);   // count N
-    data[block4 + 1] = uint8_t(N >> 8);
-    writeFileBytes(sharedFilePath("CS.ft+"), data);
-    Bytes index = indexBytes();
-    EXPECT_EQ(removeHiresFTBlocksFromSong(1, 2), 0);
-    EXPECT_EQ(lastMessageText(), CORRUPT_TEXT);
-    EXPECT_EQ(dataBytes(), data);
-    EXPECT_EQ(indexBytes(), index);
-    EXPECT_FALSE(fileExists(sharedFilePath("CS.tw")));
-}
-
-TEST_F(HiresFTRemove, ACutReachingPastTheStoredBlocksIsRefused) {
-    fillWindow(4);
-    storeWindow(4);
-    Bytes data = dataBytes(), index = indexBytes();
-    song.blockCount = 8;   // the song claims more blocks than the Hires store holds
-    EXPECT_EQ(removeHiresFTBlocksFromSong(3, 3), 0);
-    EXPECT_EQ(lastMessageText(), "Index for FT block is not stored - getFTBlockIndex (1).");
-    EXPECT_EQ(dataBytes(), data);
-    EXPECT_EQ(indexBytes(), index);
-}
-
-TEST_F(HiresFTRemove, AnIndexEntryPastTheDataOrRunningBackwardsIsRefused) {
-    fillWindow(6);
-    storeWindow(6);
-    Bytes data = dataBytes(), original = indexBytes();
-    for (uint32_t offset : {uint32_t(data.size() + 1), 0xFFFFFF00u, 0u}) {
-        clearUiCalls();
-        Bytes index = original;
-        for (int k = 0; k < 4; k++) index[4 + 8 * 3 + k] = uint8_t(offset >> (8 * k));   // block 3's offset
-        writeFileBytes(sharedFilePath("CS.fi+"), index);
-        EXPECT_EQ(removeHiresFTBlocksFromSong(1, 2), 0) << offset;
-        EXPECT_EQ(lastMessageText(),
-                  "Attempting to seeking past end of file in seekToFTBlock (2). Data will probably be corrupted.");
-        EXPECT_EQ(dataBytes(), data);
-        EXPECT_EQ(indexBytes(), index);
+    const Bytes data = dataBytes(), index = indexBytes();
+    const char* seekPastEnd = "Attempting to seeking past end of file in seekToFTBlock (2). Data will probably be corrupted.";
+    Bytes countN = data;
+    size_t block4 = getU32(index, 4 + 8 * 4);
+    countN[block4] = uint8_t(N & 0xFF);
+    countN[block4 + 1] = uint8_t(N >> 8);
+    auto block3At = [&](uint32_t offset) {
+        Bytes moved = index;
+        for (int k = 0; k < 4; k++) moved[4 + 8 * 3 + k] = uint8_t(offset >> (8 * k));
+        return moved;
+    };
+    struct Case {
+        Bytes data, index;
+        uint32_t songBlocks, first, count;
+        int failingWrite;   // the first write goes into CS.tw
+        std::string text;
+    } cases[] = {
+        {data, index, 6, 1, 2, 1, "bytesWritten does not equal bytesRead - removeHiresFTBlocksFromSong (1). Data may be corrupted."},
+        {countN, index, 6, 1, 2, 0, CORRUPT_TEXT},
+        {data, index, 8, 5, 3, 0, "Index for FT block is not stored - getFTBlockIndex (1)."},
+        {data, block3At(uint32_t(data.size() + 1)), 6, 1, 2, 0, seekPastEnd},
+        {data, block3At(0xFFFFFF00u), 6, 1, 2, 0, seekPastEnd},
+        {data, block3At(0), 6, 1, 2, 0, seekPastEnd},
+    };
+    for (const Case& c : cases) {
+        writeFileBytes(sharedFilePath("CS.ft+"), c.data);
+        writeFileBytes(sharedFilePath("CS.fi+"), c.index);
+        song.blockCount = c.songBlocks;   // 8: the song claims more blocks than the Hires store holds
+        failFileCall(FILE_OP_WRITE, c.failingWrite);
+        EXPECT_EQ(removeHiresFTBlocksFromSong(c.first, c.count), 0) << c.text;
+        EXPECT_EQ(lastMessageText(), c.text);
+        EXPECT_EQ(dataBytes(), c.data);
+        EXPECT_EQ(indexBytes(), c.index);
+        EXPECT_FALSE(fileExists(sharedFilePath("CS.tw")));
+        EXPECT_FALSE(hiresFilesOpen());
     }
 }

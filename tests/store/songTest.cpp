@@ -41,27 +41,17 @@ TEST_F(TimeAxis, BlockTimesAreSumsOfDurations) {
     EXPECT_DOUBLE_EQ(blockDuration(100000), 0.0);
 }
 
-TEST_F(TimeAxis, NoArrayMeansTimeZero) {
+// The nearest boundary, half-way rounding up; times at or past the end give the block count;
+// without an array every time is block 0.
+TEST_F(TimeAxis, BlockAtTimeFindsTheNearestBoundaryAndHalfWayRoundsUp) {
+    makeSong(10);
+    const std::pair<double, uint32_t> cases[] = {{0.0, 0},     {1.49 * D, 1},  {1.5 * D, 2},  {1.51 * D, 2},
+                                                 {3 * D, 3},   {-0.5, 0},      {10 * D, 10},  {9.6 * D, 10},
+                                                 {25.0, 10}};
+    for (auto [t, block] : cases) EXPECT_EQ(blockAtTime(t), block) << t / D << " blocks";
     resetSong();
     EXPECT_DOUBLE_EQ(songTimeOfBlock(10), 0.0);
     EXPECT_EQ(blockAtTime(1.0), 0u);
-}
-
-TEST_F(TimeAxis, BlockAtTimeFindsTheNearestBoundaryAndHalfWayRoundsUp) {
-    makeSong(10);
-    EXPECT_EQ(blockAtTime(0.0), 0u);
-    EXPECT_EQ(blockAtTime(1.49 * D), 1u);
-    EXPECT_EQ(blockAtTime(1.5 * D), 2u) << "exactly half-way goes to the following boundary";
-    EXPECT_EQ(blockAtTime(1.51 * D), 2u);
-    EXPECT_EQ(blockAtTime(3 * D), 3u);
-    EXPECT_EQ(blockAtTime(-0.5), 0u);
-}
-
-TEST_F(TimeAxis, TimesAtOrPastTheEndGiveTheBlockCount) {
-    makeSong(10);
-    EXPECT_EQ(blockAtTime(10 * D), 10u);
-    EXPECT_EQ(blockAtTime(9.6 * D), 10u);
-    EXPECT_EQ(blockAtTime(25.0), 10u);
 }
 
 TEST_F(TimeAxis, ChangedDurationsMoveBlockTimes) {

@@ -1,31 +1,26 @@
 // Closing a song: every working file goes, and nothing of the song stays in memory.
 #include <gtest/gtest.h>
 
+#include <tuple>
+
 #include "notes/noteList.h"
 #include "notes/selection.h"
 #include "platform/files.h"
 #include "platform/ui.h"
+#include "shell/closeSong.h"
 #include "shell/paths.h"
 #include "store/ftBlockStore.h"
 #include "store/song.h"
+#include "shell/settings.h"
 #include "store/workingFiles.h"
 #include "support/testSupport.h"
 
-class SongClose : public ::testing::Test {
+class SongClose : public SharedFolderTest {
 protected:
-    void SetUp() override {
-        savedPaths = paths;
-        setSharedBasePath(folder.path());
-        makeFolder(paths.sharedFolder);
-        clearUiCalls();
-    }
     void TearDown() override {
         closeSong();
-        paths = savedPaths;
-        clearUiCalls();
+        SharedFolderTest::TearDown();
     }
-    TempFolder folder;
-    Paths savedPaths;
 };
 
 TEST_F(SongClose, DeletesEveryWorkingFileAndEmptiesTheUndoFolder) {
@@ -38,7 +33,7 @@ TEST_F(SongClose, DeletesEveryWorkingFileAndEmptiesTheUndoFolder) {
     EXPECT_EQ(messageCount(), 0);
 }
 
-TEST_F(SongClose, LeavesNoBlocksNotesOrSelectionBehind) {
+TEST_F(SongClose, LeavesNoBlocksNotesInstrumentOrSelectionBehind) {
     song.sampleBlockDuration = 1.0 / 128;
     ASSERT_EQ(growSampleBlockDurations(10), 1);
     song.blockCount = 10;
@@ -49,16 +44,15 @@ TEST_F(SongClose, LeavesNoBlocksNotesOrSelectionBehind) {
     selection.timeSelectionStart = 0.1f;
     selection.timeSelectionEnd = 0.2f;
     setFTBlockWindowCapacity(song.sampleBlockDuration);
+    song.instrumentName = "Flute";
 
     closeSong();
+    EXPECT_EQ(songInstrumentName(), globalSettings.defaultInstrument);
     EXPECT_EQ(song.blockCount, 0u);
     EXPECT_TRUE(song.sampleBlockDurations.empty());
-    EXPECT_EQ(noteList.count, 0);
-    EXPECT_EQ(selection.selectedNoteCount, 0);
-    EXPECT_EQ(selection.timeSelectionStart, -1.0f);
-    EXPECT_EQ(selection.timeSelectionEnd, -1.0f);
-    EXPECT_EQ(ftBlockWindow.firstBlock, 0u);
-    EXPECT_EQ(ftBlockWindow.endBlock, 0u);
+    EXPECT_EQ(std::tuple(noteList.count, selection.selectedNoteCount, selection.timeSelectionStart, selection.timeSelectionEnd),
+              std::tuple(0, 0, -1.0f, -1.0f));
+    EXPECT_EQ(std::tuple(ftBlockWindow.firstBlock, ftBlockWindow.endBlock), std::tuple(0u, 0u));
 }
 
 TEST_F(SongClose, AFileThatCannotBeDeletedIsReported) {

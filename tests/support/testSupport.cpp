@@ -8,9 +8,12 @@
 #include <stdexcept>
 #include <unistd.h>
 
+#include "platform/allocation.h"
 #include "platform/files.h"
 #include "platform/registry.h"
-#include "shell/paths.h"
+#include "platform/ui.h"
+#include "shell/quitFlag.h"
+#include "shell/settings.h"
 
 namespace fs = std::filesystem;
 
@@ -26,6 +29,46 @@ TempFolder::~TempFolder() {
     std::error_code ignored;
     fs::remove_all(folder, ignored);
 }
+
+static void clearInjectedFailures() {
+    clearUiCalls();
+    clearFileFailures();
+    failAllocation(0);
+}
+
+void SharedFolderTest::SetUp() {
+    savedPaths = paths;
+    setSharedBasePath(folder.path());
+    makeFolder(paths.sharedFolder);
+    clearInjectedFailures();
+}
+
+void SharedFolderTest::TearDown() {
+    paths = savedPaths;
+    clearInjectedFailures();
+}
+
+static void resetConfiguration() {
+    resetRegistry();
+    resetSettings();
+    quitFlag = 0;
+}
+
+void ConfigFolderTest::SetUp() {
+    SharedFolderTest::SetUp();
+    const char* old = std::getenv("MELODRIFT_CONFIG_DIR");
+    savedConfig = old ? old : "";
+    setenv("MELODRIFT_CONFIG_DIR", config.c_str(), 1);
+    resetConfiguration();
+}
+
+void ConfigFolderTest::TearDown() {
+    setenv("MELODRIFT_CONFIG_DIR", savedConfig.c_str(), 1);
+    resetConfiguration();
+    SharedFolderTest::TearDown();
+}
+
+std::string sourceRoot() { return MELODRIFT_TEST_SOURCE_ROOT "/"; }
 
 std::vector<uint8_t> readFileBytes(const std::string& path) {
     std::ifstream in(path, std::ios::binary);

@@ -35,13 +35,6 @@ static void useOwnSharedFolder() {
     ready = true;
 }
 
-static int storeFile(const char* name, const uint8_t* data, size_t size) {
-    FILE* file = std::fopen(sharedFilePath(name).c_str(), "wb");
-    if (!file) return 0;
-    size_t written = size ? std::fwrite(data, 1, size, file) : 0;
-    return std::fclose(file) == 0 && written == size ? 1 : 0;
-}
-
 static void expectSoundBlock(const FTDataBuffer& data, const FTDataBuffer& orig, const FTDetectedBuffer& detected) {
     expect(data.nEntries < FT_DATA_ENTRIES && orig.nEntries < FT_DATA_ENTRIES &&
                detected.nEntries < FT_DETECTED_ENTRIES,
@@ -76,8 +69,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     uint8_t jobs = data[2];
     size_t indexBytes = std::min<size_t>(size - HEAD_BYTES, size_t(data[3]) | size_t(data[4]) << 8);
     const uint8_t* index = data + HEAD_BYTES;
-    if (!storeFile("CS.fi", index, indexBytes) ||
-        !storeFile("CS.ft", index + indexBytes, size - HEAD_BYTES - indexBytes))
+    if (!fuzzWriteFile(sharedFilePath("CS.fi"), index, indexBytes) ||
+        !fuzzWriteFile(sharedFilePath("CS.ft"), index + indexBytes, size - HEAD_BYTES - indexBytes))
         return 0;
     fileDelete(sharedFilePath("CS.tw"));
     song.blockCount = blockCount;
@@ -162,31 +155,27 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
 
 using Bytes = std::vector<uint8_t>;
 
-static void put32(Bytes& b, uint32_t v) {
-    for (int i = 0; i < 4; i++) b.push_back(uint8_t(v >> (8 * i)));
-}
-
 // A song of blocks with the given counts, laid out as the store writes it.
 static Bytes seed(uint8_t blockCount, uint8_t capacity, uint8_t jobs, const std::vector<uint32_t>& counts) {
     Bytes index, ft;
     size_t blocks = counts.size() / 3;
-    put32(index, uint32_t(blocks));
+    fuzzPut32(index, uint32_t(blocks));
     for (size_t b = 0; b < blocks; b++) {
         size_t start = ft.size();
         for (int buffer = 0; buffer < 3; buffer++) {
             uint32_t n = counts[b * 3 + buffer];
-            put32(ft, n);
+            fuzzPut32(ft, n);
             for (uint32_t i = 0; i < n; i++) {
                 float frequency = 100.0f + float(b * 7 + i);
                 uint32_t bits;
                 std::memcpy(&bits, &frequency, 4);
-                put32(ft, bits);
-                put32(ft, 0x3F800000);
-                put32(ft, uint32_t(i * 0x01010101u));
+                fuzzPut32(ft, bits);
+                fuzzPut32(ft, 0x3F800000);
+                fuzzPut32(ft, uint32_t(i * 0x01010101u));
             }
         }
-        put32(index, uint32_t(start));
-        put32(index, uint32_t(ft.size() - start));
+        fuzzPut32(index, uint32_t(start));
+        fuzzPut32(index, uint32_t(ft.size() - start));
     }
     Bytes input = {blockCount, capacity, jobs, uint8_t(index.size()), uint8_t(index.size() >> 8)};
     input.insert(input.end(), index.begin(), index.end());

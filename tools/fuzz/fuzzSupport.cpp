@@ -3,6 +3,7 @@
 
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <filesystem>
 #include <vector>
 
@@ -31,4 +32,37 @@ const std::string& fuzzFolder(const char* target) {
     folder = std::string(name.data()) + "/";
     std::atexit(removeFolder);
     return folder;
+}
+
+std::vector<uint8_t> fuzzReadFile(const std::string& path) {
+    std::vector<uint8_t> bytes;
+    FILE* f = std::fopen(path.c_str(), "rb");
+    if (!f) return bytes;
+    uint8_t piece[65536];
+    size_t n;
+    while ((n = std::fread(piece, 1, sizeof piece, f)) > 0) bytes.insert(bytes.end(), piece, piece + n);
+    std::fclose(f);
+    return bytes;
+}
+
+int fuzzWriteFile(const std::string& path, const uint8_t* bytes, size_t count) {
+    FILE* f = std::fopen(path.c_str(), "wb");
+    if (!f) return 0;
+    size_t written = count ? std::fwrite(bytes, 1, count, f) : 0;
+    return std::fclose(f) == 0 && written == count ? 1 : 0;
+}
+
+void fuzzPut16(std::vector<uint8_t>& b, uint32_t v) {
+    b.push_back(uint8_t(v));
+    b.push_back(uint8_t(v >> 8));
+}
+
+void fuzzPut32(std::vector<uint8_t>& b, uint32_t v) {
+    for (int i = 0; i < 4; i++) b.push_back(uint8_t(v >> (8 * i)));
+}
+
+void fuzzPutFloat(std::vector<uint8_t>& b, float v) {
+    uint32_t bits;
+    std::memcpy(&bits, &v, 4);
+    fuzzPut32(b, bits);
 }

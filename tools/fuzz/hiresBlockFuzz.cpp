@@ -45,24 +45,6 @@ static void useFuzzFolder() {
 // A broken promise of the store is a finding: stop here so the fuzzer keeps the input.
 static void expect(bool holds, const char* what) { fuzzExpect(holds, "hiresBlockFuzz", what); }
 
-static void writeBytes(const std::string& path, const uint8_t* bytes, size_t count) {
-    FILE* f = std::fopen(path.c_str(), "wb");
-    expect(f != nullptr, "cannot write an input file");
-    if (count) std::fwrite(bytes, 1, count, f);
-    std::fclose(f);
-}
-
-static Bytes fileBytes(const std::string& path) {
-    Bytes bytes;
-    FILE* f = std::fopen(path.c_str(), "rb");
-    if (!f) return bytes;
-    uint8_t piece[4096];
-    size_t n;
-    while ((n = std::fread(piece, 1, sizeof piece, f)) > 0) bytes.insert(bytes.end(), piece, piece + n);
-    std::fclose(f);
-    return bytes;
-}
-
 // Expanded bins are magnitudes (finite, not negative) with second values of 0, and
 // deviations are finite; nothing is written past the N bins.
 static void checkExpanded(const std::vector<double>& bins, const std::vector<float>& deviations, uint32_t n) {
@@ -125,8 +107,8 @@ static void readBlocks(uint32_t bins, uint32_t capacity, int64_t dataLength) {
         expect(copy != nullptr, "cannot write the copy");
         expect(writeCompressedHiresBlock(copy, buffer) == stored, "a copied block changed its size");
         fileClose(copy);
-        Bytes original = fileBytes(paths.sharedFolder + "CS.ft+");
-        Bytes copied = fileBytes(copyPath);
+        Bytes original = fuzzReadFile(paths.sharedFolder + "CS.ft+");
+        Bytes copied = fuzzReadFile(copyPath);
         expect(Bytes(original.begin() + at, original.begin() + at + stored) == copied, "a copied block changed its bytes");
     }
 
@@ -146,8 +128,8 @@ static void readBlocks(uint32_t bins, uint32_t capacity, int64_t dataLength) {
 // another, each of its stored size with a count below N, the last ending where the data file
 // now ends; the index ends behind its entries. (Entries before first are the input's own.)
 static void checkCutFiles(uint32_t first, uint32_t bins) {
-    Bytes data = fileBytes(paths.sharedFolder + "CS.ft+");
-    Bytes index = fileBytes(paths.sharedFolder + "CS.fi+");
+    Bytes data = fuzzReadFile(paths.sharedFolder + "CS.ft+");
+    Bytes index = fuzzReadFile(paths.sharedFolder + "CS.fi+");
     expect(index.size() >= 4, "the cut left no count");
     auto word = [&](size_t at) {
         return uint32_t(index[at]) | uint32_t(index[at + 1]) << 8 | uint32_t(index[at + 2]) << 16 |
@@ -186,8 +168,9 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* input, size_t size) {
     ftBlockWindow.firstBlock = 0;
     ftBlockWindow.endBlock = std::min(blocks, WINDOW_BLOCKS);
     ftBlockWindow.capacity = WINDOW_BLOCKS;
-    writeBytes(paths.sharedFolder + "CS.fi+", indexBytes, indexLength);
-    writeBytes(paths.sharedFolder + "CS.ft+", dataBytes, dataLength);
+    expect(fuzzWriteFile(paths.sharedFolder + "CS.fi+", indexBytes, indexLength) &&
+               fuzzWriteFile(paths.sharedFolder + "CS.ft+", dataBytes, dataLength),
+           "cannot write an input file");
 
     expect(openHiresFTFile(FT_READ) == 1, "the crafted files do not open");
     readBlocks(bins, capacity, int64_t(dataLength));
@@ -208,28 +191,13 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* input, size_t size) {
 
 #include "fuzzReplay.h"
 
-static void put16(Bytes& b, uint32_t v) {
-    b.push_back(uint8_t(v));
-    b.push_back(uint8_t(v >> 8));
-}
-
-static void put32(Bytes& b, uint32_t v) {
-    for (int i = 0; i < 4; i++) b.push_back(uint8_t(v >> (8 * i)));
-}
-
-static void putFloat(Bytes& b, float v) {
-    uint32_t bits;
-    std::memcpy(&bits, &v, 4);
-    put32(b, bits);
-}
-
 // A stored block of count entries spread over the bins by gap.
 static Bytes block(uint32_t count, float scale, float offset, uint8_t gap) {
     Bytes b;
-    put16(b, count);
-    putFloat(b, scale);
-    putFloat(b, offset);
-    for (uint32_t j = 0; j < count; j++) put16(b, (j * 7919u + 65535u) & 0xFFFF);
+    fuzzPut16(b, count);
+    fuzzPutFloat(b, scale);
+    fuzzPutFloat(b, offset);
+    for (uint32_t j = 0; j < count; j++) fuzzPut16(b, (j * 7919u + 65535u) & 0xFFFF);
     for (uint32_t j = 0; j < count; j++) b.push_back(gap);
     return b;
 }
@@ -238,14 +206,14 @@ static Bytes block(uint32_t count, float scale, float offset, uint8_t gap) {
 static Bytes input(uint8_t bins, uint8_t songBlocks, uint8_t flags, uint8_t first, uint8_t count,
                    const std::vector<Bytes>& blocks) {
     Bytes index, data;
-    put32(index, uint32_t(blocks.size()));
+    fuzzPut32(index, uint32_t(blocks.size()));
     for (const Bytes& b : blocks) {
-        put32(index, uint32_t(data.size()));
-        put32(index, uint32_t(b.size()));
+        fuzzPut32(index, uint32_t(data.size()));
+        fuzzPut32(index, uint32_t(b.size()));
         data.insert(data.end(), b.begin(), b.end());
     }
     Bytes in = {bins, songBlocks, flags, first, count};
-    put16(in, uint32_t(index.size()));
+    fuzzPut16(in, uint32_t(index.size()));
     in.insert(in.end(), index.begin(), index.end());
     in.insert(in.end(), data.begin(), data.end());
     return in;

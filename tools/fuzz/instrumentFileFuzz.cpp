@@ -27,17 +27,6 @@ static void useOwnFolder() {
     setUiEcho(false);
 }
 
-static std::vector<uint8_t> readAll(const std::string& path) {
-    std::vector<uint8_t> bytes;
-    FILE* f = std::fopen(path.c_str(), "rb");
-    if (!f) return bytes;
-    uint8_t buffer[65536];
-    size_t n;
-    while ((n = std::fread(buffer, 1, sizeof buffer, f)) > 0) bytes.insert(bytes.end(), buffer, buffer + n);
-    std::fclose(f);
-    return bytes;
-}
-
 static void expectSoundTable() {
     const std::vector<InstrumentDefinition>& table = instrumentDefinitions.definitions;
     expect(table.size() <= size_t(MAX_CS_INSTRUMENTS), "more definitions than the table holds");
@@ -78,10 +67,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     useOwnFolder();
     std::string input = folder + "CSInst.dat";
     std::string saved = folder + "saved.dat";
-    FILE* f = std::fopen(input.c_str(), "wb");
-    if (!f) return 0;
-    size_t written = size ? std::fwrite(data, 1, size, f) : 0;
-    if (std::fclose(f) != 0 || written != size) return 0;
+    if (!fuzzWriteFile(input, data, size)) return 0;
 
     clearUiCalls();
     setInstrumentDefinitionsFile(input);
@@ -100,7 +86,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     std::vector<InstrumentDefinition> first = instrumentDefinitions.definitions;
     setInstrumentDefinitionsFile(saved);
     expect(saveInstrumentDefinitions() == 1, "a loaded table that cannot be saved");
-    std::vector<uint8_t> savedBytes = readAll(saved);
+    std::vector<uint8_t> savedBytes = fuzzReadFile(saved);
     expect(savedBytes.size() == size, "a saved file of another size than the one loaded");
     expect(loadInstrumentDefinitions() == 1, "a saved file that does not load");
     expect(instrumentDefinitions.definitions.size() == first.size(), "a round trip that changes the count");
@@ -108,7 +94,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
         expect(sameDefinition(first[i], instrumentDefinitions.definitions[i]),
                "a round trip that changes a definition");
     expect(saveInstrumentDefinitions() == 1, "a reloaded table that cannot be saved");
-    expect(readAll(saved) == savedBytes, "a second save with other bytes");
+    expect(fuzzReadFile(saved) == savedBytes, "a second save with other bytes");
     freeInstrumentDefinitions();
     return 0;
 }
@@ -118,16 +104,6 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
 #include "fuzzReplay.h"
 
 using Bytes = std::vector<uint8_t>;
-
-static void put32(Bytes& b, uint32_t v) {
-    for (int i = 0; i < 4; i++) b.push_back(uint8_t(v >> (8 * i)));
-}
-
-static void putFloat(Bytes& b, float v) {
-    uint32_t bits;
-    std::memcpy(&bits, &v, 4);
-    put32(b, bits);
-}
 
 static void putName(Bytes& b, const char* name) {
     size_t n = std::strlen(name);
@@ -146,10 +122,10 @@ static void putDefinition(Bytes& b, const char* name, uint8_t low, uint8_t high,
     putName(b, "Studio");
     b.push_back(73);
     b.push_back(1);
-    putFloat(b, 70.0f);
-    putFloat(b, 30.0f);
-    putFloat(b, 10.0f);
-    putFloat(b, 440.0f);
+    fuzzPutFloat(b, 70.0f);
+    fuzzPutFloat(b, 30.0f);
+    fuzzPutFloat(b, 10.0f);
+    fuzzPutFloat(b, 440.0f);
     b.push_back(low);
     b.push_back(high);
     size_t next = 0;
@@ -157,8 +133,8 @@ static void putDefinition(Bytes& b, const char* name, uint8_t low, uint8_t high,
         int count = samples[size_t(s - low) % samples.size()];
         b.push_back(uint8_t(count));
         for (int k = 0; k < count; k++) {
-            putFloat(b, 0.5f * float(k + 1));
-            put32(b, 100u * uint32_t(k + 1));
+            fuzzPutFloat(b, 0.5f * float(k + 1));
+            fuzzPut32(b, 100u * uint32_t(k + 1));
             int h = harmonics[next++ % harmonics.size()];
             b.push_back(uint8_t(h));
             for (int i = 0; i < h * 56; i++) b.push_back(uint8_t(i * 7 + s));
@@ -168,7 +144,7 @@ static void putDefinition(Bytes& b, const char* name, uint8_t low, uint8_t high,
 
 static Bytes file(uint32_t count, const std::vector<Bytes>& definitions) {
     Bytes b = {10};
-    put32(b, count);
+    fuzzPut32(b, count);
     for (const Bytes& d : definitions) b.insert(b.end(), d.begin(), d.end());
     return b;
 }

@@ -13,31 +13,23 @@
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size);
 
 #include "fuzzReplay.h"
+#include "fuzzSupport.h"
 
 using Bytes = FuzzBytes;
-
-static void put16(Bytes& b, uint16_t v) {
-    b.push_back(uint8_t(v));
-    b.push_back(uint8_t(v >> 8));
-}
-
-static void put32(Bytes& b, uint32_t v) {
-    for (int i = 0; i < 4; i++) b.push_back(uint8_t(v >> (8 * i)));
-}
 
 static void putTag(Bytes& b, const char* tag) { b.insert(b.end(), tag, tag + 4); }
 
 static Bytes format(uint16_t tag, uint16_t channels, uint32_t rate, uint16_t bits, uint16_t extra = 0) {
     uint16_t align = uint16_t(channels * bits / 8);
     Bytes b;
-    put16(b, tag);
-    put16(b, channels);
-    put32(b, rate);
-    put32(b, rate * align);
-    put16(b, align);
-    put16(b, bits);
+    fuzzPut16(b, tag);
+    fuzzPut16(b, channels);
+    fuzzPut32(b, rate);
+    fuzzPut32(b, rate * align);
+    fuzzPut16(b, align);
+    fuzzPut16(b, bits);
     if (tag != 1) {
-        put16(b, extra);
+        fuzzPut16(b, extra);
         b.resize(b.size() + extra, 0x11);
     }
     return b;
@@ -45,7 +37,7 @@ static Bytes format(uint16_t tag, uint16_t channels, uint32_t rate, uint16_t bit
 
 static void chunk(Bytes& b, const char* id, const Bytes& body, int64_t claimed = -1) {
     putTag(b, id);
-    put32(b, uint32_t(claimed < 0 ? int64_t(body.size()) : claimed));
+    fuzzPut32(b, uint32_t(claimed < 0 ? int64_t(body.size()) : claimed));
     b.insert(b.end(), body.begin(), body.end());
     if (body.size() & 1) b.push_back(0);
 }
@@ -53,7 +45,7 @@ static void chunk(Bytes& b, const char* id, const Bytes& body, int64_t claimed =
 static Bytes riff(const Bytes& chunks, int64_t riffSize = -1) {
     Bytes b;
     putTag(b, "RIFF");
-    put32(b, uint32_t(riffSize < 0 ? int64_t(chunks.size() + 4) : riffSize));
+    fuzzPut32(b, uint32_t(riffSize < 0 ? int64_t(chunks.size() + 4) : riffSize));
     putTag(b, "WAVE");
     b.insert(b.end(), chunks.begin(), chunks.end());
     return b;
@@ -67,7 +59,7 @@ static Bytes ramp(size_t n) {
 
 static Bytes value32(uint32_t v) {
     Bytes b;
-    put32(b, v);
+    fuzzPut32(b, v);
     return b;
 }
 

@@ -9,6 +9,7 @@
 #include <cmath>
 #include <cstdint>
 #include <vector>
+#include <tuple>
 
 #include "analysis/vector/vectorErrors.h"
 #include "platform/ui.h"
@@ -25,12 +26,8 @@ TEST_F(MathErrors, SquareRootOfTwoNegativesReportsOnceAndGivesNaN) {
     std::vector<float> x{4, -1, 9, -16, -0.0f};
     std::vector<float> y(5);
     EXPECT_EQ(VF_sqrt(y.data(), x.data(), 5), 1);
-    EXPECT_EQ(messageCount(), 1);
-    EXPECT_EQ(lastMessageText(), "VF_sqrt: DOMAIN error\n");
-    EXPECT_EQ(std::bit_cast<uint32_t>(y[1]), 0xFFC00000u);
-    EXPECT_EQ(std::bit_cast<uint32_t>(y[3]), 0xFFC00000u);
-    EXPECT_EQ(y[0], 2.0f);
-    EXPECT_EQ(y[2], 3.0f);
+    EXPECT_EQ(std::pair(messageCount(), lastMessageText()), std::pair(1, std::string("VF_sqrt: DOMAIN error\n")));
+    EXPECT_EQ(std::tuple(std::bit_cast<uint32_t>(y[1]), std::bit_cast<uint32_t>(y[3]), y[0], y[2]), std::tuple(0xFFC00000u, 0xFFC00000u, 2.0f, 3.0f));
     EXPECT_TRUE(y[4] == 0 && std::signbit(y[4]));
     EXPECT_EQ(VF_sqrt(y.data(), x.data(), 1), 0);
 }

@@ -26,11 +26,11 @@
 #include "platform/media.h"
 #include "platform/pulse/pulseBackends.h"
 #include "platform/ui.h"
+#include "shell/closeSong.h"
 #include "shell/paths.h"
 #include "shell/settings.h"
 #include "shell/startup.h"
 #include "store/song.h"
-#include "store/workingFiles.h"
 #include "support/testSupport.h"
 
 namespace {
