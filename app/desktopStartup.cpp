@@ -14,6 +14,10 @@
 #include "app/mainFrame.h"
 #include "app/splash.h"
 #include "platform/mainloop.h"
+#include "platform/capture.h"
+#include "platform/media.h"
+#include "platform/mixer.h"
+#include "platform/pulse/pulseBackends.h"
 #include "platform/qt/qtMainLoop.h"
 #include "platform/qt/qtUi.h"
 #include "platform/ui.h"
@@ -43,10 +47,13 @@ static int startGraphics() {
     applyAppStyle(*qApp);
     installQtUi();
     installQtMainLoop();
+    // Without a sound server Play says so; nothing else needs it.
+    installPulseMedia();
     return 1;
 }
 
 static void stopGraphics() {
+    setMediaBackend(nullptr);
     setUiBackend(nullptr);
     stopQtTimers();
     setMainLoopBackend(nullptr);
@@ -78,6 +85,17 @@ StartupHooks desktopStartupHooks(int* argc, char** argv) {
     hooks.createMainFrame = createMainFrame;
     hooks.destroyMainFrame = destroyMainFrame;
     hooks.showSplash = showSplashScreen;
+    // The input to record from: the sound server's default source, with its mixer.
+    hooks.createCaptureObject = [] {
+        installPulseCapture();
+        installPulseMixer();
+        return createCaptureObject();
+    };
+    hooks.releaseCaptureObject = [] {
+        releaseCaptureObject();
+        setCaptureBackend(nullptr);
+        setMixerBackend(nullptr);
+    };
     hooks.updateMenus = updateMenus;
     return hooks;
 }

@@ -23,8 +23,13 @@
 #include "app/fileDialogs.h"
 #include "app/helpWindow.h"
 #include "app/instrumentWindow.h"
+#include "app/preferencesDialog.h"
+#include "app/speedWarningDialog.h"
 #include "app/songWindow.h"
 #include "audio/audioActivity.h"
+#include "audio/openWaveFile.h"
+#include "audio/recording.h"
+#include "audio/recordingSource.h"
 #include "notes/displayModes.h"
 #include "notes/noteList.h"
 #include "platform/mainloop.h"
@@ -60,6 +65,30 @@ static const FrameWindowFunctions frameWindowFunctions = {
     },
     [] { onUiThread([] { if (theFrame) theFrame->refreshFrame(); }); },
 };
+
+// The recorder's and the preferences' windows: the dialogs it asks for, and the meter following
+// the input's level and its caption.
+static void installRecordingWindows() {
+    preferencesDialog = runPreferencesDialog;
+    recordingHooks.quickPreferences = [] { return showQuickPreferences(PAGE_SET_RECORDING) == 0 ? 1 : 0; };
+    recordingHooks.showSpeedWarning = showSpeedWarningDialog;
+    recordingHooks.levelChanged = [] {
+        if (theFrame && theFrame->songWindow()) theFrame->songWindow()->refreshMeter();
+    };
+    meterCaptionChanged = [] {
+        if (theFrame && theFrame->songWindow()) theFrame->songWindow()->refreshMeterCaption();
+    };
+    openingState.quickPreferences = [] { return showQuickPreferences(PAGE_SET_OPENING) == 0 ? 1 : 0; };
+}
+
+static void removeRecordingWindows() {
+    preferencesDialog = nullptr;
+    recordingHooks.quickPreferences = nullptr;
+    recordingHooks.showSpeedWarning = nullptr;
+    recordingHooks.levelChanged = nullptr;
+    meterCaptionChanged = nullptr;
+    openingState.quickPreferences = nullptr;
+}
 
 // The MDI area; with no song open it says so in its middle.
 class Workspace : public QMdiArea {
@@ -130,6 +159,7 @@ MainFrame::MainFrame() {
     buildStatusBar();
     setQtUiWindow(this, parts[1]);
     setFrameWindowFunctions(&frameWindowFunctions);
+    installRecordingWindows();
 
     // The end of the session is refused like closing the frame.
     connect(qApp, &QGuiApplication::commitDataRequest, this, [this](QSessionManager& manager) {
@@ -145,6 +175,7 @@ MainFrame::~MainFrame() {
     // The child windows go after this destructor; their end must not call back into it.
     if (songSubWindow) songSubWindow->disconnect(this);
     setFrameWindowFunctions(nullptr);
+    removeRecordingWindows();
     setQtUiWindow(nullptr, nullptr);
     frameState.songWindowOpen = false;
     if (theFrame == this) theFrame = nullptr;
@@ -334,10 +365,8 @@ void MainFrame::frameCommand(int id) {
     case CMD_RECORDING_TIPS: showRecordingTips(); break;
     case CMD_ABOUT: showAbout(); break;
     case CMD_INSTRUMENTS: showInstrumentWindow(this); break;
-    // The preferences dialog with its recording source page belongs to the preferences,
-    // which this version does not have.
-    case CMD_RECORDING_SOURCE:
-    case CMD_PREFERENCES: reportNotAvailable(id); break;
+    case CMD_RECORDING_SOURCE: showQuickPreferences(PAGE_SET_SOURCE); break;
+    case CMD_PREFERENCES: runPreferencesDialog(PAGE_SET_ALL); break;
     default: break;
     }
 }
@@ -417,8 +446,12 @@ SongWindow* MainFrame::songWindow() const {
 void MainFrame::refreshFrame() {
     showModeButtons(buttons[1], buttons[2], buttons[3]);
 
+    if (QAction* record = commandAction(CMD_RECORD)) record->setText(recordLabel());
     if (!frameState.songWindowOpen) parts[2]->setText("No song");
-    else if (audioActivity.recording) parts[2]->setText("Recording");
+    else if (audioActivity.recording && recordingState.labelState == RECORD_LABEL_FINISHING)
+        parts[2]->setText(QString("Finishing  ·  %1 s").arg(songDuration(), 0, 'f', 1));
+    else if (audioActivity.recording)
+        parts[2]->setText(QString("Recording  ·  %1 s").arg(recordingState.recordedSeconds, 0, 'f', 1));
     else if (audioActivity.opening) parts[2]->setText("Opening");
     else parts[2]->setText(QString("%1 notes  ·  %2 s").arg(noteList.count).arg(songDuration(), 0, 'f', 1));
     parts[3]->setText(QString("Zoom %1%").arg(zoomPercent()));

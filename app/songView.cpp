@@ -9,14 +9,21 @@
 #include <QScrollBar>
 #include <QTimer>
 
+#include "app/mainFrame.h"
 #include "app/songViewPainter.h"
 #include "audio/audioActivity.h"
 #include "notes/displayModes.h"
+#include "notes/noteList.h"
+#include "notes/selection.h"
 #include "platform/sync.h"
+#include "playback/playback.h"
 #include "playback/playbackState.h"
 #include "playback/pointerInfo.h"
 #include "playback/songViewGeometry.h"
 #include "store/ftBlockStore.h"
+#include "shell/commandDispatch.h"
+#include "shell/commandTable.h"
+#include "shell/mainFrame.h"
 #include "store/song.h"
 
 SongView::SongView(QWidget* parent) : QAbstractScrollArea(parent) {
@@ -105,6 +112,38 @@ void SongView::paintEvent(QPaintEvent*) {
     screen.drawImage(0, 0, image);
     if (horizontalScrollBar()->maximum() != maxScrollX() || verticalScrollBar()->maximum() != maxScrollY())
         updateScrollBars();
+    // Playback paused for a change of mode starts again once the new picture is on screen;
+    // after this paint, so that a message it may show never opens inside one.
+    if (playbackState.resumePosition != -1) QTimer::singleShot(0, this, [] { resumePlayback(); });
+}
+
+static void runFrameCommand(int id) {
+    if (MainFrame* frame = mainFrame()) frame->runCommand(id);
+    else dispatchCommand(id);
+}
+
+// A click on a note selects it alone and plays it; a click beside the notes clears the note
+// selection. Playback stops either way.
+void SongView::mousePressEvent(QMouseEvent* event) {
+    if (event->button() != Qt::LeftButton || recordingOrOpeningActive()) {
+        QAbstractScrollArea::mousePressEvent(event);
+        return;
+    }
+    QPointF at = event->position();
+    int hit = -1;
+    if (at.y() < viewport()->height() - PLOT_BOTTOM_MARGIN)
+        for (int i = 0; i < noteList.count && hit < 0; i++)
+            if (noteBarRect(i).adjusted(-1, -2, 1, 2).contains(at)) hit = i;
+    stopPlayback();
+    selection.selectedNoteCount = 0;
+    selection.pointerNote = hit;
+    if (hit >= 0) {
+        selectNote(hit);
+        selection.timeSelectionStart = selection.timeSelectionEnd = NO_TIME_SELECTION;
+        previewNote(hit);
+    }
+    redrawSongView();
+    event->accept();
 }
 
 void SongView::mouseMoveEvent(QMouseEvent* event) {
@@ -115,7 +154,24 @@ void SongView::mouseMoveEvent(QMouseEvent* event) {
 }
 
 void SongView::keyPressEvent(QKeyEvent* event) {
+    bool plain = (event->modifiers() & (Qt::ControlModifier | Qt::AltModifier | Qt::MetaModifier)) == 0;
     switch (event->key()) {
+    case Qt::Key_P:
+        if (!plain) {
+            QAbstractScrollArea::keyPressEvent(event);
+            return;
+        }
+        runFrameCommand(CMD_PLAY_STOP);
+        break;
+    case Qt::Key_Return:
+    case Qt::Key_Enter: previewNote(-1); break;
+    case Qt::Key_Escape:
+        if (!isPlaying()) {
+            QAbstractScrollArea::keyPressEvent(event);
+            return;
+        }
+        stopPlayback();
+        break;
     case Qt::Key_Home: horizontalScrollBar()->setValue(0); break;
     case Qt::Key_End: horizontalScrollBar()->setValue(horizontalScrollBar()->maximum()); break;
     default: QAbstractScrollArea::keyPressEvent(event); return;

@@ -16,6 +16,9 @@
 
 #include "analysis/pitchScale.h"
 #include "audio/audioActivity.h"
+#include "audio/audioActivity.h"
+#include "audio/openWaveWorker.h"
+#include "audio/recording.h"
 #include "notes/displayModes.h"
 #include "notes/noteList.h"
 #include "notes/selection.h"
@@ -185,16 +188,11 @@ void paintNoteBar(Painting& p, const QRectF& r, bool selected) {
 // The notes as bars at midiNote (Note mode), or as a light band under the pitch curve (Detail).
 // Notes read from a MIDI file have no pitch curve: they are bars in both modes.
 void paintNotes(Painting& p) {
-    bool wave = displayModes.playbackMode == PLAYBACK_MODE_WAVE;
     bool detail = displayModes.noteMode == NOTE_MODE_DETAIL && !song.notesOnly;
     double h = noteBarHeight();
     for (int i = 0; i < noteList.count; i++) {
-        const Note& n = noteList.notes[i];
-        double start = wave ? n.waveStart : n.midiStart, end = wave ? n.waveEnd : n.midiEnd;
-        int x0 = timeToX(start), x1 = timeToX(end);
-        if (x1 < songViewGeometry.plotLeft || x0 > p.width) continue;
-        double y = pitchToY(pitchToFrequency(n.midiNote));
-        QRectF r(x0 + 0.5, y - h / 2, std::max(2, x1 - x0 - 1), h);
+        QRectF r = noteBarRect(i);
+        if (r.right() < songViewGeometry.plotLeft || r.left() > p.width) continue;
         bool selected = isNoteSelected(i) == 1;
         if (!detail) {
             paintNoteBar(p, r, selected);
@@ -277,6 +275,10 @@ void paintInfoStrip(Painting& p) {
     }
     drawStripText(p, INFO_PITCH_X, baseline, true, p.c.stripText, QString::fromStdString(info.pitchName));
     drawStripText(p, INFO_FREQUENCY_X, baseline, false, p.c.stripText, QString::fromStdString(info.frequencyText));
+    if (audioActivity.recording)
+        drawStripText(p, INFO_LOAD_X, baseline, false, p.c.stripText,
+                      QString::fromStdString(recordingLoadText(recordingState.processingLag,
+                                                               openingProgress.processingLoad * 100.0)));
 
     int segments = tuningDeviationSegments(info.tuningFrequency, info.tuningKey);
     int segmentTop = top + (PLOT_BOTTOM_MARGIN - TUNING_SEGMENT_HEIGHT) / 2;
@@ -288,6 +290,15 @@ void paintInfoStrip(Painting& p) {
 }
 
 }  // namespace
+
+QRectF noteBarRect(int index) {
+    const Note& n = noteList.notes[index];
+    bool wave = displayModes.playbackMode == PLAYBACK_MODE_WAVE;
+    int x0 = timeToX(wave ? n.waveStart : n.midiStart), x1 = timeToX(wave ? n.waveEnd : n.midiEnd);
+    double h = noteBarHeight();
+    double y = pitchToY(pitchToFrequency(n.midiNote));
+    return QRectF(x0 + 0.5, y - h / 2, std::max(2, x1 - x0 - 1), h);
+}
 
 int paintSongView(QImage& image) {
     if (image.isNull()) return 0;

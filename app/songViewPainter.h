@@ -5,6 +5,7 @@
 // engine's song view geometry. The song view widget and the Qt tests call it.
 
 #include <QColor>
+#include <QRectF>
 
 class QImage;
 
@@ -46,6 +47,10 @@ const SongViewColours& songViewColours();
 // under the drawing lock. The drawing settings switch anti-aliasing, translucent fills and
 // gradients. 0 when the image cannot be painted on (the caller shows the display problem).
 int paintSongView(QImage& image);
+
+// Where note index is drawn: a bar at its key over its time span (the wave span in Wave mode,
+// the MIDI span in MIDI mode), in drawing window pixels. Clicks on a note hit this rectangle.
+QRectF noteBarRect(int index);
 
 // The text shown instead of the picture when it cannot be painted.
 constexpr const char* DISPLAY_PROBLEM_TEXT = "DISPLAY PROBLEM: Cannot select bitmap object into current DC.";

@@ -10,8 +10,10 @@
 #include "app/levelMeter.h"
 #include "app/mainFrame.h"
 #include "app/songView.h"
+#include "audio/audioActivity.h"
+#include "audio/recordingSource.h"
 #include "notes/displayModes.h"
-#include "playback/playbackState.h"
+#include "playback/playback.h"
 #include "playback/pointerInfo.h"
 #include "playback/songViewGeometry.h"
 #include "shell/commandDispatch.h"
@@ -93,10 +95,21 @@ void SongWindow::showMeterForSong() {
 
 void SongWindow::refresh() {
     showModeButtons(buttons[0], buttons[1], buttons[2]);
-    buttons[3]->setText(playbackRunning() ? "Stop" : "Play");
+    buttons[3]->setText(playButtonLabel());
     view->songChanged();
     showMeterForSong();
+    // A recording that starts names its source and level on the meter.
+    if (audioActivity.recording && !wasRecording) refreshMeterCaption();
+    wasRecording = audioActivity.recording;
     if (meter) meter->update();
+}
+
+void SongWindow::refreshMeter() {
+    if (meter) meter->update();
+}
+
+void SongWindow::refreshMeterCaption() {
+    if (meter && meter->isVisible()) meter->setWindowTitle(QString::fromStdString(meterLevelText()));
 }
 
 void SongWindow::closeEvent(QCloseEvent* event) {

@@ -22,6 +22,9 @@ public:
     ~SongWindow() override;
     // The song, its modes or the zoom changed: buttons, view and meter follow.
     void refresh();
+    // The meter shows the newest level; its caption the recording source and its level.
+    void refreshMeter();
+    void refreshMeterCaption();
     SongView* songView() const { return view; }
     MeterWindow* meterWindow() const { return meter; }
     // 0 playback mode, 1 note mode, 2 layout, 3 Play/Stop, 4 fit to window.
@@ -39,4 +42,5 @@ private:
     QToolButton* buttons[5] = {};
     SongView* view;
     QPointer<MeterWindow> meter;
+    bool wasRecording = false;   // a recording ran at the last refresh
 };

@@ -109,12 +109,7 @@ int openWaveFile(const std::string& path) {
     // The set-up below is the processing of this opening until the worker takes it over.
     std::unique_lock<std::mutex> processing(CSWaveProcessingMutex);
     bool appending = song.blockCount > 0;
-    recognitionOptions.learningInstruments = false;
-    releaseFrequencyAnalysis();
-    clearAnalysisSampleBuffer();   // no buffer in view: a chunk is one group of blocks
-    o.startTime = timeCounter();
-    o.samplesBefore = songSamples();
-    if (!setupFrequencyAnalysis()) return 1;
+    if (!beginSongAnalysis()) return 1;
 
     // Every later failure leaves the song as it was: no analysis, no open FT files, CS.fw at rest.
     struct Unwind {
@@ -142,20 +137,7 @@ int openWaveFile(const std::string& path) {
     unwind.armed = false;
 
     songWindowHooks.showSongView();
-    o.samplesDone = o.samplesBefore;
-    o.storedSamples = o.samplesBefore;
-    o.samplesRead = 0;
-    o.sourceBytesRead = 0;
-    o.endOfSource = -1;
-    o.recognitionShare = globalSettings.boostSpeed ? 0.1 : 0.2;
-    o.displayShare = globalSettings.boostSpeed ? 0.05 : 0.1;
-    resetOpeningProgress();
-    openingProgress.notesPosition = 0;
-    openingProgress.recognisedTo = o.samplesBefore;
-    openingProgress.blocksWrittenBack = song.blockCount;
-    openingProgress.hiresBlocksStored = song.blockCount;
-
-    o.sourcePath = fullPath(path);
+    prepareSongWorker(fullPath(path), false);
     processing.unlock();
     audioActivity.opening = true;
     audioActivity.openingSeconds =
@@ -165,6 +147,37 @@ int openWaveFile(const std::string& path) {
     startWorker(o.worker, CSOpenWaveFileDataThread);
     if (!appending) setSongNamesFromFile(path);
     return 1;
+}
+
+int beginSongAnalysis() {
+    OpeningState& o = openingState;
+    recognitionOptions.learningInstruments = false;
+    releaseFrequencyAnalysis();
+    clearAnalysisSampleBuffer();   // no buffer in view: a chunk is one group of blocks
+    o.startTime = timeCounter();
+    o.samplesBefore = songSamples();
+    return setupFrequencyAnalysis();
+}
+
+void prepareSongWorker(const std::string& sourcePath, bool recording) {
+    OpeningState& o = openingState;
+    o.samplesDone = o.samplesBefore;
+    o.storedSamples = o.samplesBefore;
+    o.samplesRead = 0;
+    // A recording's samples follow the song's own in CS.fw; a file is read from its start.
+    o.sourceBytesRead = recording ? o.samplesBefore * uint32_t(song.waveFormat.bitsPerSample / 8) : 0;
+    o.endOfSource = -1;
+    o.recognitionShare = globalSettings.boostSpeed ? 0.1 : 0.2;
+    o.displayShare = globalSettings.boostSpeed ? 0.05 : 0.1;
+    resetOpeningProgress();
+    openingProgress.notesPosition = 0;
+    openingProgress.recognisedTo = o.samplesBefore;
+    openingProgress.blocksWrittenBack = song.blockCount;
+    openingProgress.hiresBlocksStored = song.blockCount;
+    o.sourcePath = sourcePath;
+    o.recording = recording;
+    o.recordedBytes = o.samplesBefore * uint32_t(song.waveFormat.bitsPerSample / 8);
+    o.recordingComplete = false;
 }
 
 void requestOpeningStop() {
@@ -197,6 +210,9 @@ void resetOpeningState() {
     o.recognitionShare = 0.2;
     o.displayShare = 0.1;
     o.startTime = 0;
+    o.recording = false;
+    o.recordedBytes = 0;
+    o.recordingComplete = false;
     resetOpeningProgress();
     std::lock_guard<std::mutex> guard(levelMeter.lock);
     std::fill(std::begin(levelMeter.levels), std::end(levelMeter.levels), 0);

@@ -32,6 +32,13 @@ constexpr const char* OPENING_DISK_LOW_TEXT =
 // was done (the quick preferences were cancelled).
 int openWaveFile(const std::string& path);
 
+// Shared by opening and recording, holding CSWaveProcessingMutex: a new analysis pass from the
+// song's present end (samples before, start time, analysis tables). 1; 0 when the tables cannot
+// be made (reported).
+int beginSongAnalysis();
+// The worker's counters for a pass over sourcePath (CS.fw when recording), before it starts.
+void prepareSongWorker(const std::string& sourcePath, bool recording);
+
 // The user's stop (the song view): the worker finishes at the next chunk boundary and the
 // song keeps what was analysed. Nothing happens when no opening runs.
 void requestOpeningStop();

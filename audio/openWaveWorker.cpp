@@ -181,27 +181,10 @@ static int appendToWorkingFile() {
     }
     if (o.samplesDone == o.storedSamples) return 1;
     uint32_t bps = bytesPerSample();
-    std::string path = sharedFilePath("CS.fw");
-    waitForUndoSnapshotWriter();
-    std::lock_guard<std::mutex> access(CSAccessWaveFileMutex);
-    unmaskWaveWorkingFile();
-    WaveReadInfo layout{};
-    if (wioFileOpen(&layout, path, 0) != WIO_OPENED) {
-        showMessage(MESSAGE_ERROR, HAND_ON_OPEN_TEXT_1);
-        return 0;
-    }
-    wioFileClose(&layout);
-    auto closeFile = [](FILE* f) { fileClose(f); };
-    std::unique_ptr<FILE, decltype(closeFile)> file(openReportedFile(path, "r+b"), closeFile);
-    if (!file) return 0;
     const uint8_t* samples = o.chunkBuffer.data() + size_t(int64_t(o.storedSamples) - o.bufferFirstSample) * bps;
     size_t bytes = size_t(o.samplesDone - o.storedSamples) * bps;
     uint32_t dataBytes = o.samplesDone * bps;
-    if (!seekReportedFile(file.get(), int64_t(layout.dataOffset) + int64_t(o.storedSamples) * bps) ||
-        !writeReportedBytes(file.get(), samples, bytes) ||
-        !patchWaveHeader(file.get(), layout, dataBytes, song.waveFormat.bitsPerSample))
-        return 0;
-    if (!closeReportedFile(file.release())) return 0;
+    if (!appendToWaveWorkingFile(o.storedSamples * bps, samples, bytes, HAND_ON_OPEN_TEXT_1)) return 0;
     o.storedSamples = o.samplesDone;
     song.workingWaveBytes = dataBytes;
     openingProgress.recordedSeconds = double(dataBytes) * 8 / song.waveFormat.bitsPerSample / analysisGeometry.sampleRate;
@@ -270,10 +253,12 @@ int cantoscopeWaveformData() {
         o.samplesDone = uint32_t(next);
     }
     if (analysisBufferEnd() < int64_t(o.samplesDone)) showMessage(MESSAGE_ERROR, EXCESS_NEGATIVE_TEXT);
-    if (!appendToWorkingFile()) return 0;
+    // A recording's samples are in CS.fw already: the recorder put them there.
+    if (o.recording) o.storedSamples = std::max(o.storedSamples, o.samplesDone);
+    else if (!appendToWorkingFile()) return 0;
 
     bool failed = false;
-    bool last = workerStopRequested(o.worker) || sourceExhausted(&failed);
+    bool last = workerStopRequested(o.worker) || (o.recording ? o.endOfSource >= 0 : sourceExhausted(&failed));
     // Blocks leave the 30-second window as chunks arrive; recognition must run (and write its
     // blocks back) before the blocks it has not seen leave it, however it is throttled.
     uint32_t unrecognised = song.blockCount - std::min(song.blockCount, blockAtTime(p.recognisedTo / double(analysisGeometry.sampleRate)));
@@ -336,6 +321,7 @@ static void finishOpening() {
         closeFTFile(1);
         closeHiresFTFile(1);
     }
+    if (o.recording && o.finishRecording) o.finishRecording();
     waitForUndoSnapshotWriter();
     {
         std::lock_guard<std::mutex> access(CSAccessWaveFileMutex);
@@ -344,7 +330,44 @@ static void finishOpening() {
     std::vector<uint8_t>().swap(o.chunkBuffer);
     o.bufferBytes = 0;
     o.bufferSamples = 0;
-    postToMainLoop(openingEnded);
+    postToMainLoop(o.recording && o.recordingEnded ? o.recordingEnded : openingEnded);
+}
+
+// How far the source reaches, in samples of this pass in whole blocks: the file's length when
+// opening; when recording, what the recorder has stored in CS.fw so far. *complete when no
+// more will come (a file; a recording once its last stretch is stored).
+static uint32_t sourceSamples(bool* complete, bool* failed) {
+    OpeningState& o = openingState;
+    uint32_t blockSamples = analysisGeometry.blockSamples;
+    *failed = false;
+    if (o.recording) {
+        // The flag before the count: a count read after it includes the last stretch.
+        *complete = o.recordingComplete;
+        uint32_t stored = o.recordedBytes / bytesPerSample();
+        uint32_t samples = stored > o.samplesBefore ? stored - o.samplesBefore : 0;
+        return samples / blockSamples * blockSamples;
+    }
+    *complete = true;
+    WaveReadInfo info{};
+    if (wioFileOpen(&info, o.sourcePath, 0) != WIO_OPENED) {
+        showMessage(MESSAGE_ERROR, THREAD_OPEN_TEXT_1);
+        *failed = true;
+        return 0;
+    }
+    // The trailing part of a block at the file's end is not analysed.
+    uint32_t whole = info.dataSamples / blockSamples * blockSamples;
+    wioFileClose(&info);
+    return whole;
+}
+
+// The end of a recording that came right after a whole chunk: the blocks the last chunk could
+// not finish for want of what follows them are analysed now, with silence after the end.
+static void analyseRecordingTail() {
+    OpeningState& o = openingState;
+    if (o.endOfSource >= 0 || o.bufferSamples == 0) return;
+    std::lock_guard<std::mutex> processing(CSWaveProcessingMutex);
+    o.endOfSource = int64_t(o.samplesBefore) + o.samplesRead;
+    cantoscopeWaveformData();
 }
 
 void CSOpenWaveFileDataThread() {
@@ -363,19 +386,26 @@ void CSOpenWaveFileDataThread() {
     uint32_t bps = bytesPerSample();
     bool firstChunk = true;
     while (true) {
-        WaveReadInfo info{};
-        if (wioFileOpen(&info, o.sourcePath, 0) != WIO_OPENED) {
-            showMessage(MESSAGE_ERROR, THREAD_OPEN_TEXT_1);
+        if (workerStopRequested(o.worker)) break;
+        bool complete = false, failed = false;
+        uint32_t wholeSamples = sourceSamples(&complete, &failed);
+        if (failed) break;
+        uint32_t wanted = chunk + (firstChunk ? leadIn : 0);
+        // A recording is read a whole chunk at a time until its last stretch is stored; the
+        // worker sleeps until the recorder has stored more.
+        if (o.recording && !complete && wholeSamples - std::min(wholeSamples, o.samplesRead) < wanted) {
+            suspendWorker(o.worker);
+            continue;
+        }
+        if (o.endOfSource >= 0) break;
+        if (o.samplesRead >= wholeSamples) {
+            if (o.recording) analyseRecordingTail();
             break;
         }
-        // The trailing part of a block at the file's end is not analysed.
-        uint32_t wholeSamples = info.dataSamples / blockSamples * blockSamples;
-        wioFileClose(&info);
-        if (o.endOfSource >= 0 || o.samplesRead >= wholeSamples) break;
-        if (workerStopRequested(o.worker)) break;
-        uint32_t count = std::min(chunk + (firstChunk ? leadIn : 0), wholeSamples - o.samplesRead);
+        uint32_t count = std::min(wanted, wholeSamples - o.samplesRead);
         count = count / blockSamples * blockSamples;
         if (count == 0) break;
+        WaveReadInfo info{};
 
         p.chunkStartedAt = clockMilliseconds();
         std::unique_lock<std::mutex> processing(CSWaveProcessingMutex);
@@ -389,10 +419,13 @@ void CSOpenWaveFileDataThread() {
         wioFileClose(&info);
         access.unlock();
         if (!filled) break;
-        if (o.samplesRead >= wholeSamples) o.endOfSource = int64_t(o.samplesBefore) + o.samplesRead;
-        pushLevelMeterValue(levelMeterValue(o.chunkBuffer.data() + o.bufferBytes - size_t(count) * bps, count,
-                                            song.waveFormat.bitsPerSample));
+        if (o.samplesRead >= wholeSamples && complete) o.endOfSource = int64_t(o.samplesBefore) + o.samplesRead;
+        // While recording the recorder shows the level of what it captures.
+        if (!o.recording)
+            pushLevelMeterValue(levelMeterValue(o.chunkBuffer.data() + o.bufferBytes - size_t(count) * bps, count,
+                                                song.waveFormat.bitsPerSample));
         int handedOn = cantoscopeWaveformData();
+        if (o.recording && o.recordingChunkDone) o.recordingChunkDone(o.samplesDone);
         processing.unlock();
         p.chunks++;
         if (!handedOn || workerStopRequested(o.worker)) break;

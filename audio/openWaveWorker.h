@@ -35,6 +35,15 @@ struct OpeningState {
     uint32_t startTime;             // time counter when the opening started, hundredths of a second
     int (*quickPreferences)();      // installed by the desktop program: the accuracy/speed preferences before
                                     // opening into an empty song; 1 confirmed, 0 cancelled; null: not offered
+    bool recording;                 // the worker reads a recording from CS.fw rather than a file (recorder)
+    std::atomic<uint32_t> recordedBytes;    // while recording: CS.fw's data bytes stored so far (recorder)
+    std::atomic<bool> recordingComplete;    // while recording: the last stretch is stored, no more comes (recorder)
+    // The recorder's part at a recording's moments (audio/recording.h fills them): after each
+    // chunk, with the samples analysed; as the worker finishes (CS.fw finalised); and posted as
+    // the worker's last act, in place of openingEnded.
+    void (*recordingChunkDone)(uint32_t samplesAnalysed);
+    void (*finishRecording)();
+    void (*recordingEnded)();
     SuspendableWorker worker;       // CSOpenWaveFileDataThread; its stop request is the user's stop
 };
 extern OpeningState openingState;

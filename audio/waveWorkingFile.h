@@ -51,6 +51,12 @@ int unmaskWaveWorkingFile();
 // 0 when a file routine failed (it has shown its message).
 int patchWaveHeader(FILE* file, const WaveReadInfo& layout, uint32_t dataBytes, uint16_t bits);
 
+// Appends count bytes of samples to CS.fw after its first storedBytes data bytes, under the
+// usual order for CS.fw (the file is left plain, as a recording or an opening keeps it), and
+// patches its header for storedBytes + count. 1; 0 after openFailureText (CS.fw is no wave file)
+// or a file routine's own message.
+int appendToWaveWorkingFile(uint32_t storedBytes, const uint8_t* samples, size_t count, const char* openFailureText);
+
 // Result codes of finaliseWaveWorkingFile.
 enum WaveFinaliseResult {
     WAVE_FINALISED = 0,        // header patched, file cut to data offset + data bytes

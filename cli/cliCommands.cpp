@@ -1,6 +1,17 @@
 // The table of the command-line tool's commands.
 #include "cli/cliCommands.h"
 
+#include <cstdio>
+#include <cstdlib>
+
+#include "audio/audioActivity.h"
+#include "audio/openWaveFile.h"
+#include "notes/noteList.h"
+#include "platform/files.h"
+#include "platform/ui.h"
+#include "store/song.h"
+#include "shell/closeSong.h"
+
 const std::vector<CliCommand>& cliCommands() {
     static const std::vector<CliCommand> commands = {
         {"info", "FILE", "print the format, size and duration of a wave file", 1, runInfoCommand},
@@ -13,6 +24,12 @@ const std::vector<CliCommand>& cliCommands() {
          "open a wave or MIDI file as the desktop program does, print its notes, save them as MIDI and the song "
          "as a wave",
          1, runOpenCommand},
+        {"play", "FILE [--midi] [--from S] [--to E]",
+         "open a wave file and play the song (its notes with --midi) through the sound server, S to E seconds", 1,
+         runPlayCommand},
+        {"record", "OUT.wav --seconds N [--from-file FILE [--fast]] [--notes-csv FILE] [--midi FILE]",
+         "record N seconds from the default input (or a wave file fed in its place) and save the song and its notes",
+         1, runRecordCommand},
         {"learn-instrument", "[--replace] [--output FILE] FILE...",
          "learn instrument definitions from recordings named with their parameters", 1, runLearnInstrumentCommand},
     };
@@ -23,4 +40,48 @@ const CliCommand* findCliCommand(const std::string& name) {
     for (const CliCommand& command : cliCommands())
         if (name == command.name) return &command;
     return nullptr;
+}
+
+bool parseSeconds(const std::string& text, double* seconds) {
+    char* after = nullptr;
+    double value = std::strtod(text.c_str(), &after);
+    if (after == text.c_str() || *after != '\0' || !(value >= 0)) return false;
+    *seconds = value;
+    return true;
+}
+
+int openSongFromCommandLine(const std::string& input) {
+    openWaveFile(input);
+    if (!audioActivity.opening) {
+        closeSong();
+        return 0;   // refused; the message is on stderr
+    }
+    waitForOpeningToEnd();
+    if (song.blockCount > 0) return 1;
+    std::fprintf(stderr, "melodrift-cli: %s holds less than one block of audio\n", input.c_str());
+    closeSong();
+    return 0;
+}
+
+// The table goes to a new file beside path, renamed over it once it is complete.
+int writeSongNotesCsv(const std::string& path) {
+    std::string temporary;
+    FILE* csv = createFileBeside(path, &temporary);
+    if (!csv) {
+        showMessage(MESSAGE_ERROR, "Cannot " + path);
+        return 0;
+    }
+    std::fprintf(csv, "onset_s,offset_s,midi_pitch,pitch_hz,volume_sum\n");
+    for (int i = 0; i < noteList.count; i++) {
+        const Note& n = noteList.notes[i];
+        std::fprintf(csv, "%.4f,%.4f,%u,%.2f,%u\n", double(n.waveStart), double(n.waveEnd), unsigned(n.midiNote),
+                     double(n.pitch), n.volumeSum);
+    }
+    bool failed = std::ferror(csv) != 0;
+    if (fileClose(csv) != 0 || failed || renameFile(temporary, path) != 0) {
+        fileDelete(temporary);
+        showMessage(MESSAGE_ERROR, "Cannot " + path);
+        return 0;
+    }
+    return 1;
 }

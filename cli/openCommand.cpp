@@ -11,7 +11,6 @@
 #include <cstdlib>
 #include <string>
 
-#include "audio/audioActivity.h"
 #include "audio/openWaveFile.h"
 #include "audio/waveWorkingFile.h"
 #include "notes/noteList.h"
@@ -39,14 +38,6 @@ struct OpenRequest {
     bool enhanced = false;   // "CS Enhanced pitch accuracy" for this run
     bool boost = false;      // "CS Boost speed" for this run
 };
-
-static bool parseSeconds(const std::string& text, double* seconds) {
-    char* after = nullptr;
-    double value = std::strtod(text.c_str(), &after);
-    if (after == text.c_str() || *after != '\0' || !(value >= 0)) return false;
-    *seconds = value;
-    return true;
-}
 
 // Reads the arguments after the command's name; false (after saying why) when they are not
 // understood.
@@ -105,29 +96,6 @@ static std::string noteName(int midiNote) {
     return std::string(names[midiNote % 12]) + std::to_string(midiNote / 12 - 1);
 }
 
-// The table goes to a new file beside path, renamed over it once it is complete.
-static int writeNotesTable(const std::string& path) {
-    std::string temporary;
-    FILE* csv = createFileBeside(path, &temporary);
-    if (!csv) {
-        showMessage(MESSAGE_ERROR, "Cannot " + path);
-        return 0;
-    }
-    std::fprintf(csv, "onset_s,offset_s,midi_pitch,pitch_hz,volume_sum\n");
-    for (int i = 0; i < noteList.count; i++) {
-        const Note& n = noteList.notes[i];
-        std::fprintf(csv, "%.4f,%.4f,%u,%.2f,%u\n", double(n.waveStart), double(n.waveEnd), unsigned(n.midiNote),
-                     double(n.pitch), n.volumeSum);
-    }
-    bool failed = std::ferror(csv) != 0;
-    if (fileClose(csv) != 0 || failed || renameFile(temporary, path) != 0) {
-        fileDelete(temporary);
-        showMessage(MESSAGE_ERROR, "Cannot " + path);
-        return 0;
-    }
-    return 1;
-}
-
 static void printSummary(const OpenRequest& request) {
     const OpeningState& o = openingState;
     std::printf("File: %s\n", request.input.c_str());
@@ -166,7 +134,7 @@ static void printSummary(const OpenRequest& request) {
 static int writeOutputs(const OpenRequest& request) {
     int written = 1;
     if (!request.notesPath.empty()) {
-        if (writeNotesTable(request.notesPath)) std::printf("Notes table: %s\n", request.notesPath.c_str());
+        if (writeSongNotesCsv(request.notesPath)) std::printf("Notes table: %s\n", request.notesPath.c_str());
         else written = 0;
     }
     if (!request.midiPath.empty()) {
@@ -218,19 +186,9 @@ int runOpenCommand(const std::vector<std::string>& arguments) {
         closeSong();
         return result;
     }
-    openWaveFile(request.input);
-    if (!audioActivity.opening) {
-        closeSong();
-        return EXIT_FAILED;   // refused; the message is on stderr
-    }
-    waitForOpeningToEnd();
-    int result = EXIT_FAILED;
-    if (song.blockCount == 0) {
-        std::fprintf(stderr, "melodrift-cli: %s holds less than one block of audio\n", request.input.c_str());
-    } else {
-        printSummary(request);
-        result = writeOutputs(request) ? 0 : EXIT_FAILED;
-    }
+    if (!openSongFromCommandLine(request.input)) return EXIT_FAILED;
+    printSummary(request);
+    int result = writeOutputs(request) ? 0 : EXIT_FAILED;
     closeSong();
     return result;
 }

@@ -60,12 +60,13 @@ void updatePointerInfo(int x, int y) {
     pointerInfo.lastY = y;
     double t = xToTime(x);
 
-    if (audioActivity.recording) {
-        setTexts(POINTER_KIND_RECORDING, formatSongTime(songDuration()), "", "", "");
-        return;
-    }
+    // A recording being finished is still a recording: the finishing goes first.
     if (pointerInfo.finishing) {
         setTexts(POINTER_KIND_FINISHING, formatSongTime(songDuration()), "", "", "");
+        return;
+    }
+    if (audioActivity.recording) {
+        setTexts(POINTER_KIND_RECORDING, formatSongTime(songDuration()), "", "", "");
         return;
     }
     if (audioActivity.opening) {

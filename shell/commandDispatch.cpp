@@ -4,7 +4,9 @@
 
 #include "audio/audioActivity.h"
 #include "audio/openWaveFile.h"
+#include "audio/recording.h"
 #include "notes/displayModes.h"
+#include "playback/playback.h"
 #include "platform/ui.h"
 #include "shell/closeSong.h"
 #include "shell/commandTable.h"
@@ -22,6 +24,8 @@ void reportNotAvailable(int command) { showMessage(MESSAGE_INFORMATION, notAvail
 static void editCommand(int command) {
     // The Edit menu speaks to the song's window; without it there is nothing to edit.
     if (!commandEnabled(command, currentMenuState())) return;
+    // A note preview never plays on while the song changes under it.
+    stopPreview();
     if (!commandOperations.handleSongViewCode) {
         reportNotAvailable(command);
         return;
@@ -31,6 +35,7 @@ static void editCommand(int command) {
 
 static void noteCommand(int command) {
     if (!commandEnabled(command, currentMenuState())) return;
+    stopPreview();
     if (!commandOperations.runNoteCommand) {
         reportNotAvailable(command);
         return;
@@ -48,6 +53,8 @@ static void recordCommand() {
         reportNotAvailable(CMD_RECORD);
         return;
     }
+    // What sounds from the speakers would be recorded with the voice.
+    if (!audioActivity.recording) stopPlayback();
     // A song of notes read from a MIDI file has no recording to add to: a recording starts a
     // song of its own.
     if (!audioActivity.recording && song.notesOnly) {

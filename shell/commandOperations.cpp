@@ -2,8 +2,10 @@
 #include "shell/commandOperations.h"
 
 #include "audio/openWaveFile.h"
+#include "audio/recording.h"
 #include "playback/midiImport.h"
 #include "playback/midiOutput.h"
+#include "playback/playback.h"
 
 // Filled as their owners are built.
 CommandOperations commandOperations = [] {
@@ -11,5 +13,8 @@ CommandOperations commandOperations = [] {
     operations.openWaveFile = openWaveFile;
     operations.readMidiFile = importMidiFile;
     operations.writeNotesMidiFile = saveMidiFile;
+    operations.toggleRecording = startRecording;
+    operations.playSong = playSong;
+    operations.pausePlayback = pausePlayback;
     return operations;
 }();

@@ -4,6 +4,7 @@
 
 #include "audio/audioActivity.h"
 #include "notes/displayModes.h"
+#include "playback/playback.h"
 #include "platform/ui.h"
 #include "shell/closeSong.h"
 #include "shell/commandOperations.h"
@@ -112,6 +113,8 @@ int songWindowMayClose() { return refuseWhileBusy() ? 0 : 1; }
 
 void songWindowClosed() {
     frameState.songWindowOpen = false;
+    // The playback files are the song's working files, and nothing of it may sound on.
+    stopPlayback();
     closeSong();
     // The next song must not be saved over this one's file without a dialog.
     resetSongNames();

@@ -9,16 +9,19 @@
 #include <unistd.h>
 
 #include "analysis/instrumentDefinitions.h"
+#include "audio/recording.h"
 #include "platform/files.h"
 #include "platform/mainloop.h"
 #include "platform/sync.h"
 #include "platform/ui.h"
+#include "playback/playback.h"
 #include "shell/appTimers.h"
 #include "shell/closeSong.h"
 #include "shell/mainFrame.h"
 #include "shell/openQueue.h"
 #include "shell/paths.h"
 #include "shell/quitFlag.h"
+#include "shell/recordingView.h"
 #include "shell/saveSong.h"
 #include "shell/settings.h"
 #include "store/fileRoutines.h"
@@ -68,6 +71,9 @@ static std::string currentDirectory() {
 static void stopEarly() {
     if (appState.hooks.stopGraphics) appState.hooks.stopGraphics();
 }
+
+// The capture notification event, served by the main loop.
+static void serveCaptureEvent() { handleCaptureNotification(); }
 
 int startUp(const StartupOptions& options) {
     appState = AppState{};
@@ -127,7 +133,11 @@ int startUp(const StartupOptions& options) {
     loadInstrumentDefinitions();
     createNamedMutexes();
     emptyUndoFolder();
+    // A recording the last run did not finish is a take the user has sung: it is kept.
+    recoverUnfinishedRecording();
     deleteWorkingFiles();
+    setCaptureEventHandler(serveCaptureEvent);
+    recordingHooks.stateChanged = recordingStateChanged;
 
     if (generalSettings.splashScreen && appState.hooks.showSplash) appState.hooks.showSplash();
 
@@ -166,6 +176,8 @@ static void deleteDocumentTemporaries() {
 }
 
 int shutDown(int exitCode) {
+    // Nothing sounds on after the program, and its playback files go with the song.
+    stopPlayback();
     setCaptureEventHandler(nullptr);
     resetOpenQueue();
     resetAppTimers();

@@ -16,6 +16,7 @@ int runQtPlatformTests(int argc, char** argv);
 int runDesktopStartupTests(int argc, char** argv);
 int runSongViewTests(int argc, char** argv);
 int runInstrumentWindowTests(int argc, char** argv);
+int runPreferencesDialogTests(int argc, char** argv);
 
 int main(int argc, char** argv) {
     if (qEnvironmentVariableIsEmpty("QT_QPA_PLATFORM")) qputenv("QT_QPA_PLATFORM", "offscreen");
@@ -37,5 +38,6 @@ int main(int argc, char** argv) {
     failures += runDesktopStartupTests(argc, argv) != 0;
     failures += runSongViewTests(argc, argv) != 0;
     failures += runInstrumentWindowTests(argc, argv) != 0;
+    failures += runPreferencesDialogTests(argc, argv) != 0;
     return failures;
 }

@@ -282,9 +282,6 @@ private slots:
         frame->commandAction(CMD_PLAY_STOP)->trigger();
         QCOMPARE(QString::fromStdString(lastMessageText()),
                  QString("Play/Stop is not available in this version of Torvellan Melodrift."));
-        frame->commandAction(CMD_PREFERENCES)->trigger();
-        QCOMPARE(QString::fromStdString(lastMessageText()),
-                 QString("Preferences is not available in this version of Torvellan Melodrift."));
         displayModes.playbackMode = PLAYBACK_MODE_MIDI;
         frame->commandAction(CMD_SAVE)->trigger();
         QCOMPARE(QString::fromStdString(lastMessageText()),

@@ -6,6 +6,7 @@
 #include <QKeyEvent>
 #include <QMdiArea>
 #include <QScrollBar>
+#include <QTemporaryDir>
 #include <QTest>
 #include <QToolButton>
 
@@ -18,6 +19,10 @@
 #include "appTestSupport.h"
 #include "audio/openWaveFile.h"
 #include "playback/meterGeometry.h"
+#include "platform/media.h"
+#include "platform/files.h"
+#include "shell/paths.h"
+#include "playback/playback.h"
 #include "playback/playbackState.h"
 #include "playback/pointerInfo.h"
 #include "playback/songViewGeometry.h"
@@ -68,6 +73,8 @@ private slots:
         setLevels({});
     }
     void cleanup() {
+        stopPlayback();
+        resetNullMedia();
         freeFTBlockWindow();
         resetEngineState();
         resetPlaybackState();
@@ -219,6 +226,55 @@ private slots:
         QCOMPARE(timeToX(1.0) - timeToX(0.0), 64);
         frame.songWindow()->toolbarButton(4)->click();   // fit: the 4 s fill the visible plot
         QCOMPARE(timeToX(songDuration()), LABEL_COLUMN_WIDTH + visiblePlotWidth());
+    }
+
+    // Playback from the song window on the null device, in MIDI mode (it needs notes only).
+    void playIsStartedAndStoppedByThePlayButtonAndTheKeyAndAClickPlaysANote() {
+        QTemporaryDir folder;   // the playback file's shared folder
+        Paths savedPaths = paths;
+        setSharedBasePath(folder.path().toStdString());
+        makeFolder(paths.sharedFolder);
+        makeSong(512, 3);
+        commandOperations.playSong = playSong;
+        commandOperations.pausePlayback = pausePlayback;
+        displayModes.playbackMode = PLAYBACK_MODE_MIDI;
+        MainFrame frame;
+        frame.showFrame();
+        QVERIFY(QTest::qWaitForWindowExposed(&frame));
+        frame.showSongWindow();
+        QApplication::processEvents();
+        QToolButton* play = frame.songWindow()->toolbarButton(3);
+        SongView* view = frame.songWindow()->songView();
+        QCOMPARE(play->text(), QString("Play"));
+        play->click();
+        QVERIFY2(isPlaying(), lastMessageText().c_str());
+        QCOMPARE(play->text(), QString("Stop"));
+        QTest::keyClick(view, Qt::Key_P);
+        QVERIFY(!isPlaying());
+        QCOMPARE(play->text(), QString("Play"));
+
+        // A mode change pauses; the repaint that follows plays on from the cursor.
+        QTest::keyClick(view, Qt::Key_P);
+        playbackState.cursor = 120;
+        frame.commandAction(CMD_NOTE_MODE)->trigger();
+        QVERIFY(!isPlaying());
+        QTRY_VERIFY(isPlaying());
+        QCOMPARE(playbackState.startCopy, 120);
+        QCOMPARE(play->text(), QString("Stop"));
+
+        QRectF bar = noteBarRect(1);
+        QTest::mouseClick(view->viewport(), Qt::LeftButton, {}, bar.center().toPoint());
+        QCOMPARE(selection.selectedNoteCount, 1);
+        QCOMPARE(selection.selectedNotes[0], 1);
+        QVERIFY(isPlaying());
+        QCOMPARE(playbackState.preview, 1);
+        QCOMPARE(playbackState.startCopy, 25);
+        QTest::keyClick(view, Qt::Key_Escape);
+        QVERIFY(!isPlaying());
+        QTest::keyClick(view, Qt::Key_Return);   // the selected note again
+        QCOMPARE(playbackState.startCopy, 25);
+        stopPlayback();
+        paths = savedPaths;
     }
 
     // A silent meter is only its background; each level's bar has its colour, and a narrow

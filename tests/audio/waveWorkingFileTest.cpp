@@ -290,14 +290,14 @@ TEST_F(WaveSegment, AFailedOrRefusedWriteLeavesTheWorkingFileAtRest) {
     std::string nowhere = folder.file("no such folder/out.wav");
     struct Case {
         std::string path;
-        int failingWrite;   // unmasking, header, first piece, second piece
+        int failingWrite;   // unmasking, header, the samples
         AudioActivity activity;
         std::string text;
     } cases[] = {
         {nowhere, 0, {}, "Cannot " + nowhere},
         {out, 0, {false, true, 0.0}, ""},
         {out, 0, {true, false, 0.0}, ""},
-        {out, 4, {}, "Bytes were not stored properly"},
+        {out, 3, {}, "Bytes were not stored properly"},
     };
     for (const Case& c : cases) {
         clearUiCalls();
@@ -305,9 +305,13 @@ TEST_F(WaveSegment, AFailedOrRefusedWriteLeavesTheWorkingFileAtRest) {
         audioActivity = c.activity;
         EXPECT_EQ(writeWaveSegment(c.path, -1.0, -1.0), 0);
         EXPECT_EQ(messageCount(), c.text.empty() ? 0 : 1);
-        if (!c.text.empty()) EXPECT_EQ(lastMessageText(), c.text);
+        if (!c.text.empty()) {
+            EXPECT_EQ(lastMessageText(), c.text);
+        }
         expectWorkingFileAtRest();
-        if (c.failingWrite == 0) EXPECT_FALSE(fileExists(c.path));
+        if (c.failingWrite == 0) {
+            EXPECT_FALSE(fileExists(c.path));
+        }
     }
     audioActivity = AudioActivity{};
     fileDelete(workingPath());
