@@ -10,6 +10,7 @@
 #include <QFileInfo>
 #include <QFormLayout>
 #include <QLineEdit>
+#include <QMessageBox>
 #include <QSpinBox>
 
 #include "analysis/instrumentDefinitions.h"
@@ -18,8 +19,10 @@
 #include "app/recognitionOptionsDialog.h"
 #include "audio/audioActivity.h"
 #include "notes/noteList.h"
+#include "platform/media.h"
 #include "platform/ui.h"
 #include "playback/midiOutput.h"
+#include "playback/playback.h"
 #include "playback/songViewGeometry.h"
 #include "resources/strings.h"
 #include "shell/commandTable.h"
@@ -163,9 +166,35 @@ int writeScaleFromDialog(QWidget* parent) {
         return 0;
     std::string low = pitchName(p.lowSemitone, true, PITCH_NAMES_DIATONIC);
     std::string high = pitchName(p.highSemitone, true, PITCH_NAMES_DIATONIC);
-    showMessage(MESSAGE_INFORMATION,
-                "The scale from " + low + " to " + high + " is saved in '" + path.toStdString() +
-                    "'. Play it on the instrument and record it, then save the recording under a name such as " +
-                    p.name + "_Real_Studio_440.0_" + low + "_" + high + "_0.wav and learn it with Learn.");
+    if (askYesNo("The scale from " + low + " to " + high + " is saved in '" + path.toStdString() +
+                 "'. Play it on the instrument and record it, then save the recording under a name such as " +
+                 p.name + "_Real_Studio_440.0_" + low + "_" + high +
+                 "_0.wav and learn it with Learn.\n\nListen to the scale now?"))
+        playScaleFile(parent, path.toStdString());
     return 1;
+}
+
+// The box shown while the scale plays; the device's end notice closes it.
+static QMessageBox* scaleBox = nullptr;
+
+int playScaleFile(QWidget* parent, const std::string& path) {
+    stopPlayback();   // the sequencer is one device: the song's MIDI playback lets it go
+    int device = -1;
+    int result = mediaOpen(MEDIA_TYPE_SEQUENCER, path, &device);
+    if (result == MEDIA_OK) result = mediaPlay(device, [](int) {
+        if (scaleBox) scaleBox->accept();
+    });
+    if (result != MEDIA_OK) {
+        if (device >= 0) mediaClose(device);
+        showMessage(MESSAGE_ERROR, mediaErrorString(result));
+        return 0;
+    }
+    QMessageBox box(QMessageBox::Information, "Scale MIDI File", "Playing the scale. Press Escape to stop.",
+                    QMessageBox::Cancel, parent);
+    box.setObjectName("scalePlayingBox");
+    scaleBox = &box;
+    int finished = box.exec() == QDialog::Accepted;
+    scaleBox = nullptr;
+    mediaClose(device);
+    return finished;
 }

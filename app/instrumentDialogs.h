@@ -55,6 +55,9 @@ int deleteCurrentDefinition();
 // The scale to record a new instrument from: the parameters, then the Save dialog proposing
 // scaleMidiFileName's name. 1 when written.
 int writeScaleFromDialog(QWidget* parent);
+// Plays the scale file at path on the MIDI device while a box says so; Escape (or the box's
+// Cancel) stops it. 1 when it played to its end, 0 when stopped or it could not play.
+int playScaleFile(QWidget* parent, const std::string& path);
 
 // The Save dialog of the scale before it runs (the tests look at it).
 QFileDialog* createScaleSaveDialog(QWidget* parent, const DefinitionParameters& parameters);

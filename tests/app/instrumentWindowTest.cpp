@@ -11,6 +11,7 @@
 #include <QTemporaryDir>
 #include <QTest>
 #include <QTextBrowser>
+#include <QTimer>
 #include <QToolButton>
 
 #include "analysis/instrumentDefinitions.h"
@@ -26,8 +27,11 @@
 #include "app/songWindow.h"
 #include "app/songViewPainter.h"
 #include "appTestSupport.h"
+#include "platform/media.h"
+#include "platform/qt/qtMainLoop.h"
 #include "playback/instrumentView.h"
 #include "playback/midiImport.h"
+#include "playback/midiOutput.h"
 #include "playback/songViewGeometry.h"
 #include "shell/commandTable.h"
 
@@ -167,6 +171,27 @@ private slots:
         QCOMPARE(learn->nameFilters(), QStringList({"Instrument recordings (*.wav *.ftb)"}));
         QCOMPARE(learn->fileMode(), QFileDialog::ExistingFiles);
         delete learn;
+    }
+
+    void theSavedScaleCanBeHeardAndEscapeStopsIt() {
+        installQtMainLoop();   // the device's timer and its end notice run in the box's event loop
+        std::string path = file("scale.mid").toStdString();
+        QCOMPARE(writeScaleMidiFile(path, "Flute", 60, 62, 0.5, 100), 1);
+        auto escape = [] {
+            if (QWidget* box = QApplication::activeModalWidget()) QTest::keyClick(box, Qt::Key_Escape);
+        };
+        QTimer::singleShot(100, escape);
+        QCOMPARE(playScaleFile(nullptr, path), 0);
+        // Left alone, the box closes itself when the device has played the three notes (the
+        // guard stops a wait that never ends, failing the check).
+        QTimer guard;
+        guard.setSingleShot(true);
+        connect(&guard, &QTimer::timeout, escape);
+        guard.start(10000);
+        QCOMPARE(playScaleFile(nullptr, path), 1);
+        QCOMPARE(messageCount(), 0);
+        QCOMPARE(playScaleFile(nullptr, file("missing.mid").toStdString()), 0);
+        QCOMPARE(lastMessageText(), mediaErrorString(MEDIA_ERROR_FILE));
     }
 
     void learningWithASongOpenSaysSoOnceBeforeAskingForRecordings() {
