@@ -81,7 +81,7 @@ TEST_F(AnalysisGeometrySetup, EachRangeAndOptionGivesItsBlocksLevelsAndGrid) {
                                                          {r.chunkBlocks, g.chunkBlocks}, {r.windowCapacity, g.windowCapacity},
                                                          {uint32_t(r.pitchBins), uint32_t(g.pitchBins)}};
         for (auto [expected, actual] : checked)
-            if (expected) EXPECT_EQ(actual, expected);
+            if (expected) { EXPECT_EQ(actual, expected); }
     }
     AnalysisGeometry g = geometryFor(PITCH_RANGE_LOW_TO_MID, true, false);
     EXPECT_EQ(g.hiresBins, 32768u);

@@ -23,9 +23,9 @@ protected:
         ASSERT_EQ(noteList.count, int(expected.size())) << what;
         for (size_t i = 0; i < expected.size(); i++) {
             const Note& n = noteList.notes[i];
-            if (expected[i].midiNote) EXPECT_EQ(n.midiNote, expected[i].midiNote) << what << " note " << i;
-            if (expected[i].first >= 0) EXPECT_NEAR(n.waveStart, blockTime(expected[i].first), 1e-6) << what << " note " << i;
-            if (expected[i].end >= 0) EXPECT_NEAR(n.waveEnd, blockTime(expected[i].end), 1e-6) << what << " note " << i;
+            if (expected[i].midiNote) { EXPECT_EQ(n.midiNote, expected[i].midiNote) << what << " note " << i; }
+            if (expected[i].first >= 0) { EXPECT_NEAR(n.waveStart, blockTime(expected[i].first), 1e-6) << what << " note " << i; }
+            if (expected[i].end >= 0) { EXPECT_NEAR(n.waveEnd, blockTime(expected[i].end), 1e-6) << what << " note " << i; }
         }
     }
     // A definition of one sine harmonic per semitone, as the program generates for most names.

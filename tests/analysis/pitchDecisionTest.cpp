@@ -62,7 +62,7 @@ TEST_F(PitchDecision, TheFundamentalIsChosenAndItsBandMerged) {
         setBlocks(0, 60, c.entries, c.loudness);
         decide(0, 0, 60);
         EXPECT_NEAR(cents(blockPitch(30), c.pitch), 0.0, 50.0) << c.pitch;
-        if (c.amplitude >= 0) EXPECT_EQ(blockData(30).entries[0].amplitude, c.amplitude) << c.pitch;
+        if (c.amplitude >= 0) { EXPECT_EQ(blockData(30).entries[0].amplitude, c.amplitude) << c.pitch; }
     }
 }
 

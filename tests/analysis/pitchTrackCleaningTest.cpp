@@ -263,6 +263,6 @@ TEST_F(RecognitionFlattening, OnlyAGlideOfTwoSemitonesIntoASteadyStretchIsFlatte
         setPitches(c.glideBlocks, c.steadyEnd, 220.0);
         flattenGlissando(0, 80);
         EXPECT_EQ(blockData(0).blockFlags & (BLOCK_GLISSANDO | BLOCK_LONG_GLISSANDO), c.flags) << c.from;
-        if (!c.flags) EXPECT_NEAR(blockPitch(0), 220.0 * std::exp2(c.from / 12.0), 1e-3) << "stays";
+        if (!c.flags) { EXPECT_NEAR(blockPitch(0), 220.0 * std::exp2(c.from / 12.0), 1e-3) << "stays"; }
     }
 }

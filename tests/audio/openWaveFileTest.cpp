@@ -233,7 +233,7 @@ TEST_F(OpenWaveWorker, EachFileIsStoredAsItsWholeBlocksOfOneChannel) {
         EXPECT_FALSE(ftFilesOpen());
         EXPECT_FALSE(hiresFilesOpen());
         EXPECT_EQ(analysisBuffersReady(), 0);
-        if (c.blocks == 0) EXPECT_EQ(noteList.count, 0);
+        if (c.blocks == 0) { EXPECT_EQ(noteList.count, 0); }
     }
     // At rest CS.fw is masked, with a header that agrees with its data.
     std::vector<uint8_t> onDisk = readFileBytes(sharedFilePath("CS.fw"));

@@ -47,7 +47,7 @@ TEST(InstrumentView, ASynthesisedDefinitionDrawsItsOvertonesAboveAndWeaker) {
         const HarmonicMark& mark = marks[size_t(5 + h)];
         EXPECT_EQ(mark.sample, 1);
         EXPECT_NEAR(mark.strength, strengths[h], 1e-12) << h;
-        if (h > 0) EXPECT_LT(mark.y, marks[size_t(5 + h - 1)].y) << h;
+        if (h > 0) { EXPECT_LT(mark.y, marks[size_t(5 + h - 1)].y) << h; }
     }
 }
 

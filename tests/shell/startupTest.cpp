@@ -106,7 +106,7 @@ TEST_F(StartUp, TheFreeSpaceDecidesWhetherStartUpWarnsOrStops) {
         setFreeDiskSpaceOverride(c.space);
         EXPECT_EQ(startUp(options), c.started) << c.space;
         EXPECT_EQ(messageCount(), c.text ? 1 : 0) << c.space;
-        if (c.text) EXPECT_EQ(lastMessageText(), c.text);
+        if (c.text) { EXPECT_EQ(lastMessageText(), c.text); }
         EXPECT_EQ(instanceLockHeld(), c.started == 1);
         EXPECT_EQ(fileExists(shared("!InUse")), c.started == 1);
         if (c.started) shutDown(0);
