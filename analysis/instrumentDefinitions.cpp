@@ -12,6 +12,7 @@
 
 #include "platform/allocation.h"
 #include "platform/files.h"
+#include "platform/text.h"
 #include "platform/ui.h"
 #include "resources/strings.h"
 #include "shell/paths.h"
@@ -46,95 +47,25 @@ void freeInstrumentDefinitions() {
 
 // ---- names: UTF-8 in memory, 32 zero-padded UTF-16 units in the file ----
 
-// The next code point of text from i (advanced past it); a byte that does not start a valid,
-// shortest UTF-8 sequence gives U+FFFD and is passed over alone.
-static uint32_t nextCodePoint(const std::string& text, size_t& i) {
-    uint32_t c = uint8_t(text[i]);
-    int extra = c < 0x80 ? 0 : (c >> 5) == 6 ? 1 : (c >> 4) == 14 ? 2 : (c >> 3) == 30 ? 3 : -1;
-    if (extra == 0) {
-        i++;
-        return c;
-    }
-    if (extra < 0 || i + size_t(extra) >= text.size()) {
-        i++;
-        return 0xFFFD;
-    }
-    uint32_t value = c & (0x3Fu >> extra);
-    for (int k = 1; k <= extra; k++) {
-        uint32_t next = uint8_t(text[i + size_t(k)]);
-        if ((next >> 6) != 2) {
-            i++;
-            return 0xFFFD;
-        }
-        value = value << 6 | (next & 0x3F);
-    }
-    static const uint32_t smallest[] = {0, 0x80, 0x800, 0x10000};
-    if (value < smallest[extra] || value > 0x10FFFF || (value >= 0xD800 && value < 0xE000)) {
-        i++;
-        return 0xFFFD;
-    }
-    i += size_t(extra) + 1;
-    return value;
-}
-
 // The name's UTF-16 units, cut at a character boundary to what the field holds.
 static void encodeName(const std::string& name, uint8_t out[2 * INSTRUMENT_NAME_UNITS]) {
     std::memset(out, 0, 2 * INSTRUMENT_NAME_UNITS);
-    int used = 0;
-    for (size_t i = 0; i < name.size();) {
-        uint32_t c = nextCodePoint(name, i);
-        uint16_t units[2];
-        int count = 1;
-        if (c >= 0x10000) {
-            units[0] = uint16_t(0xD800 + ((c - 0x10000) >> 10));
-            units[1] = uint16_t(0xDC00 + ((c - 0x10000) & 0x3FF));
-            count = 2;
-        } else {
-            units[0] = uint16_t(c);
-        }
-        if (used + count > INSTRUMENT_NAME_UNITS) break;
-        for (int k = 0; k < count; k++, used++) {
-            out[2 * used] = uint8_t(units[k]);
-            out[2 * used + 1] = uint8_t(units[k] >> 8);
-        }
-    }
-}
-
-static void appendUtf8(std::string& text, uint32_t c) {
-    if (c < 0x80) {
-        text += char(c);
-    } else if (c < 0x800) {
-        text += char(0xC0 | c >> 6);
-        text += char(0x80 | (c & 0x3F));
-    } else if (c < 0x10000) {
-        text += char(0xE0 | c >> 12);
-        text += char(0x80 | (c >> 6 & 0x3F));
-        text += char(0x80 | (c & 0x3F));
-    } else {
-        text += char(0xF0 | c >> 18);
-        text += char(0x80 | (c >> 12 & 0x3F));
-        text += char(0x80 | (c >> 6 & 0x3F));
-        text += char(0x80 | (c & 0x3F));
+    std::u16string units = cutUtf16(utf8ToUtf16(name), INSTRUMENT_NAME_UNITS);
+    for (size_t i = 0; i < units.size(); i++) {
+        out[2 * i] = uint8_t(units[i]);
+        out[2 * i + 1] = uint8_t(units[i] >> 8);
     }
 }
 
 // The units up to the first zero (all 32 when there is none); a lone surrogate gives U+FFFD.
 static std::string decodeName(const uint8_t in[2 * INSTRUMENT_NAME_UNITS]) {
-    std::string name;
+    std::u16string units;
     for (int i = 0; i < INSTRUMENT_NAME_UNITS; i++) {
-        uint32_t u = uint32_t(in[2 * i]) | uint32_t(in[2 * i + 1]) << 8;
+        char16_t u = char16_t(in[2 * i] | in[2 * i + 1] << 8);
         if (u == 0) break;
-        if (u >= 0xD800 && u < 0xDC00 && i + 1 < INSTRUMENT_NAME_UNITS) {
-            uint32_t low = uint32_t(in[2 * i + 2]) | uint32_t(in[2 * i + 3]) << 8;
-            if (low >= 0xDC00 && low < 0xE000) {
-                appendUtf8(name, 0x10000 + ((u - 0xD800) << 10) + (low - 0xDC00));
-                i++;
-                continue;
-            }
-        }
-        appendUtf8(name, u >= 0xD800 && u < 0xE000 ? 0xFFFD : u);
+        units += u;
     }
-    return name;
+    return utf16ToUtf8(units);
 }
 
 std::string fitInstrumentName(const std::string& name) {
