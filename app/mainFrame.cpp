@@ -437,6 +437,8 @@ void MainFrame::showSongWindow() {
 
 void MainFrame::refreshSongWindow() {
     if (SongWindow* view = songWindow()) view->refresh();
+    // An edited song says so in its title.
+    if (songSubWindow) songSubWindow->setWindowTitle(song.changed ? "Waveview display *" : "Waveview display");
 }
 
 SongWindow* MainFrame::songWindow() const {

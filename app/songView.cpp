@@ -15,6 +15,8 @@
 #include "notes/displayModes.h"
 #include "notes/noteList.h"
 #include "notes/selection.h"
+#include "notes/songViewInput.h"
+#include "notes/songViewKeys.h"
 #include "platform/sync.h"
 #include "playback/playback.h"
 #include "playback/playbackState.h"
@@ -153,28 +155,76 @@ void SongView::mouseMoveEvent(QMouseEvent* event) {
     QAbstractScrollArea::mouseMoveEvent(event);
 }
 
-void SongView::keyPressEvent(QKeyEvent* event) {
-    bool plain = (event->modifiers() & (Qt::ControlModifier | Qt::AltModifier | Qt::MetaModifier)) == 0;
-    switch (event->key()) {
-    case Qt::Key_P:
-        if (!plain) {
-            QAbstractScrollArea::keyPressEvent(event);
-            return;
-        }
-        runFrameCommand(CMD_PLAY_STOP);
-        break;
+// The virtual key of a Qt key: letters and digits are their upper-case characters.
+static int virtualKeyOf(int key) {
+    if ((key >= Qt::Key_A && key <= Qt::Key_Z) || (key >= Qt::Key_0 && key <= Qt::Key_9)) return key;
+    if (key >= Qt::Key_F1 && key <= Qt::Key_F12) return VKEY_F1 + (key - Qt::Key_F1);
+    switch (key) {
+    case Qt::Key_Backspace: return VKEY_BACKSPACE;
+    case Qt::Key_Tab:
+    case Qt::Key_Backtab: return VKEY_TAB;
     case Qt::Key_Return:
-    case Qt::Key_Enter: previewNote(-1); break;
-    case Qt::Key_Escape:
-        if (!isPlaying()) {
-            QAbstractScrollArea::keyPressEvent(event);
-            return;
+    case Qt::Key_Enter: return VKEY_ENTER;
+    case Qt::Key_Escape: return VKEY_ESCAPE;
+    case Qt::Key_Space: return VKEY_SPACE;
+    case Qt::Key_PageUp: return VKEY_PAGE_UP;
+    case Qt::Key_PageDown: return VKEY_PAGE_DOWN;
+    case Qt::Key_End: return VKEY_END;
+    case Qt::Key_Home: return VKEY_HOME;
+    case Qt::Key_Left: return VKEY_LEFT;
+    case Qt::Key_Up: return VKEY_UP;
+    case Qt::Key_Right: return VKEY_RIGHT;
+    case Qt::Key_Down: return VKEY_DOWN;
+    case Qt::Key_Insert: return VKEY_INSERT;
+    case Qt::Key_Delete: return VKEY_DELETE;
+    default: return 0;
+    }
+}
+
+int songViewCodeOfKey(const QKeyEvent* event) {
+    Qt::KeyboardModifiers held = event->modifiers();
+    int modifiers = (held & Qt::ControlModifier ? KEY_MODIFIER_CTRL : 0) |
+                    (held & Qt::ShiftModifier || event->key() == Qt::Key_Backtab ? KEY_MODIFIER_SHIFT : 0) |
+                    (held & Qt::AltModifier ? KEY_MODIFIER_ALT : 0);
+    return songViewKeyCode(virtualKeyOf(event->key()), modifiers);
+}
+
+bool SongView::event(QEvent* event) {
+    // Tab and Shift+Tab select notes here instead of moving the focus.
+    if (event->type() == QEvent::KeyPress) {
+        auto* key = static_cast<QKeyEvent*>(event);
+        if (key->key() == Qt::Key_Tab || key->key() == Qt::Key_Backtab) {
+            keyPressEvent(key);
+            return true;
         }
-        stopPlayback();
-        break;
-    case Qt::Key_Home: horizontalScrollBar()->setValue(0); break;
-    case Qt::Key_End: horizontalScrollBar()->setValue(horizontalScrollBar()->maximum()); break;
-    default: QAbstractScrollArea::keyPressEvent(event); return;
+    }
+    return QAbstractScrollArea::event(event);
+}
+
+void SongView::keyPressEvent(QKeyEvent* event) {
+    // Playback's keys first: P plays or stops, Enter previews the selected note, and Escape
+    // stops a playback before it clears anything.
+    bool plain = (event->modifiers() & (Qt::ControlModifier | Qt::AltModifier | Qt::MetaModifier)) == 0;
+    if ((event->key() == Qt::Key_P && plain) || event->key() == Qt::Key_Return || event->key() == Qt::Key_Enter ||
+        (event->key() == Qt::Key_Escape && isPlaying())) {
+        if (event->key() == Qt::Key_P) runFrameCommand(CMD_PLAY_STOP);
+        else if (event->key() == Qt::Key_Escape) stopPlayback();
+        else previewNote(-1);
+        event->accept();
+        return;
+    }
+    int code = songViewCodeOfKey(event);
+    if (code == 0 || code == CODE_SPACE) {
+        QAbstractScrollArea::keyPressEvent(event);
+        return;
+    }
+    handleSongViewCode(code);
+    // The song may have changed under every window of the frame.
+    if (MainFrame* frame = mainFrame()) {
+        frame->refreshSongWindow();
+        frame->refreshFrame();
+    } else {
+        songChanged();
     }
     event->accept();
 }

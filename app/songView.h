@@ -7,6 +7,11 @@
 #include <QAbstractScrollArea>
 #include <QImage>
 
+class QKeyEvent;
+
+// The song view's code of a key press (notes/songViewKeys.h); 0 for a key it does not take.
+int songViewCodeOfKey(const QKeyEvent* event);
+
 class SongView : public QAbstractScrollArea {
     Q_OBJECT
 public:
@@ -25,6 +30,7 @@ protected:
     void mouseMoveEvent(QMouseEvent* event) override;
     void mousePressEvent(QMouseEvent* event) override;
     void keyPressEvent(QKeyEvent* event) override;
+    bool event(QEvent* event) override;
 
 private:
     void updateScrollBars();

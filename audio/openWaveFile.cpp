@@ -142,8 +142,9 @@ int openWaveFile(const std::string& path) {
     audioActivity.opening = true;
     audioActivity.openingSeconds =
         o.sourceDuration + (song.waveFormat.samplesPerSec ? double(o.samplesBefore) / song.waveFormat.samplesPerSec : 0.0);
-    // The undo snapshot of the opening is taken here, before the worker starts: it is the
-    // undo store's to take, and this build has none yet.
+    // An opening that appends to a song can be undone: the snapshot holds the song before it.
+    takeUndoSnapshot();
+    markUndoStale(UNDO_FT_CHANGED | UNDO_WAVE_CHANGED);
     startWorker(o.worker, CSOpenWaveFileDataThread);
     if (!appending) setSongNamesFromFile(path);
     return 1;

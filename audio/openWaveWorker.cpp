@@ -166,11 +166,6 @@ static void chooseRecognitionRange() {
     p.analysisRestart = restart;
 }
 
-static bool undoWriterBusy() {
-    std::lock_guard<std::mutex> guard(CSAccessHiresFTFileMutex);
-    return undoState.snapshotWriterBusy;
-}
-
 // Appends the analysed samples CS.fw does not hold yet and patches its header. 1; 0 after a
 // message (the opening stops; CS.fw keeps its earlier audio and header).
 static int appendToWorkingFile() {

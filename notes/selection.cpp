@@ -17,6 +17,8 @@ void resetSelection() {
     selection.timeSelectionEnd = NO_TIME_SELECTION;
     selection.pointerNote = -1;
     selection.pointerBarline = -1;
+    selection.anchorNote = -1;
+    selection.anchorBarline = -1;
 }
 
 static double halfBlock() { return song.sampleBlockDuration / 2; }
@@ -61,6 +63,50 @@ int selectBarline(int i) {
     if (selection.selectedBarlineCount >= MAX_CS_BARLINES) return 0;
     selection.selectedBarlines[selection.selectedBarlineCount++] = i;
     return 1;
+}
+
+// Drops i from list and lowers the entries above it.
+static void dropIndex(int* list, int& count, int i) {
+    int kept = 0;
+    for (int k = 0; k < count; k++) {
+        if (list[k] == i) continue;
+        list[kept++] = list[k] > i ? list[k] - 1 : list[k];
+    }
+    count = kept;
+}
+
+static void raiseIndices(int* list, int count, int i) {
+    for (int k = 0; k < count; k++)
+        if (list[k] >= i) list[k]++;
+}
+
+static void followRemoval(int& index, int i) {
+    if (index == i) index = -1;
+    else if (index > i) index--;
+}
+
+void noteRemoved(int i) {
+    dropIndex(selection.selectedNotes, selection.selectedNoteCount, i);
+    followRemoval(selection.pointerNote, i);
+    followRemoval(selection.anchorNote, i);
+}
+
+void barlineRemoved(int i) {
+    dropIndex(selection.selectedBarlines, selection.selectedBarlineCount, i);
+    followRemoval(selection.pointerBarline, i);
+    followRemoval(selection.anchorBarline, i);
+}
+
+void noteInserted(int i) {
+    raiseIndices(selection.selectedNotes, selection.selectedNoteCount, i);
+    if (selection.pointerNote >= i) selection.pointerNote++;
+    if (selection.anchorNote >= i) selection.anchorNote++;
+}
+
+void barlineInserted(int i) {
+    raiseIndices(selection.selectedBarlines, selection.selectedBarlineCount, i);
+    if (selection.pointerBarline >= i) selection.pointerBarline++;
+    if (selection.anchorBarline >= i) selection.anchorBarline++;
 }
 
 int isNoteSelected(int i, int* position) {

@@ -18,6 +18,9 @@ struct Selection {
     float timeSelectionEnd = NO_TIME_SELECTION;   // selected stretch's end, seconds; negative when none
     int pointerNote = -1;                         // note under the pointer or being dragged; -1 none (song view)
     int pointerBarline = -1;                      // barline under the pointer or being dragged; -1 none (song view)
+    // The song view's two further selection words, saved and restored with each undo level:
+    int anchorNote = -1;                          // the note a Shift-click extends the selection from; -1 none (song view)
+    int anchorBarline = -1;                       // the barline a Shift-click extends it from; -1 none (song view)
 };
 extern Selection selection;
 
@@ -35,6 +38,15 @@ int selectNote(int i);
 // Adds barline i to selectedBarlines unless it is there already. 1 when selected afterwards;
 // 0 when i is not a barline of the list.
 int selectBarline(int i);
+
+// Note i left the note list: it leaves the selection (and the pointer), and selected notes
+// after it move down one place. The same for a barline.
+void noteRemoved(int i);
+void barlineRemoved(int i);
+// A note was inserted at index i: selected notes from i on move up one place. The same for a
+// barline.
+void noteInserted(int i);
+void barlineInserted(int i);
 
 // 1 when note (barline) i is selected, with its place in the selection in *position when
 // position is given; 0 otherwise (a negative i never is).

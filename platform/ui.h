@@ -45,6 +45,9 @@ void beginProgress(const std::string& title, int total);
 void stepProgress(int done);                      // done of total steps so far
 void endProgress();
 void beep();
+// Puts a complete RIFF WAVE file on the system clipboard (as audio/wav data), replacing what
+// it held. 1 when the clipboard took it.
+int setClipboardWave(const std::vector<uint8_t>& riffWave);
 
 // A backend replaces every call above. The Qt backend is installed by the desktop program.
 struct UiBackend {
@@ -55,6 +58,7 @@ struct UiBackend {
     void (*stepProgress)(int done);
     void (*endProgress)();
     void (*beep)();
+    int (*setClipboardWave)(const std::vector<uint8_t>& riffWave);
 };
 // Installs a backend; nullptr goes back to the headless one.
 void setUiBackend(const UiBackend* backend);
@@ -68,7 +72,8 @@ enum UiCallKind {
     UI_PROGRESS_BEGIN,
     UI_PROGRESS_STEP,
     UI_PROGRESS_END,
-    UI_BEEP
+    UI_BEEP,
+    UI_CLIPBOARD
 };
 
 struct UiCall {
@@ -84,6 +89,8 @@ const std::vector<UiCall>& uiCalls();   // every call since the last clearUiCall
 void clearUiCalls();                    // also forgets preset answers
 std::string lastMessageText();          // text of the last box shown; "" when none
 int messageCount();                     // boxes shown since the last clearUiCalls()
+// The bytes the last setClipboardWave put on the headless clipboard (kept across clearUiCalls).
+const std::vector<uint8_t>& clipboardWave();
 // Answers for the next Yes/No boxes, in order; when none are left the answer is Yes.
 void presetAnswers(const std::vector<int>& answers);
 // Copy every box to stderr as it is shown (the command-line tool turns this on).

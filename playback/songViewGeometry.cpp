@@ -244,3 +244,14 @@ int scrollToSongEnd() {
     songViewGeometry.scrollX = target;
     return 1;
 }
+
+int scrollToShowTimes(double start, double end) {
+    SongViewGeometry& g = songViewGeometry;
+    if (visiblePlotWidth() <= 0) return 0;
+    int left = g.plotLeft, right = g.plotLeft + visiblePlotWidth();
+    if (timeToX(start) >= left && timeToX(end) <= right) return 0;
+    int scroll = std::clamp(int(start * pixelsPerSecond()) - AUTO_SCROLL_MARGIN, 0, maxScrollX());
+    if (scroll == g.scrollX) return 0;
+    g.scrollX = scroll;
+    return 1;
+}

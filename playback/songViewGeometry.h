@@ -118,3 +118,6 @@ int fitZoomToWindow();
 int autoScrollSongView(double cursorTime, double endTime);
 // Scrolls so that the song's end is in view (the newest notes while opening). 1 when it moved.
 int scrollToSongEnd();
+// Scrolls so that [start, end] seconds is in view when it is not: its start then stands at the
+// auto-scroll margin right of the plot's left edge. 1 when the view scrolled.
+int scrollToShowTimes(double start, double end);

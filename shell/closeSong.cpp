@@ -6,14 +6,18 @@
 #include "notes/selection.h"
 #include "playback/midiImport.h"
 #include "playback/midiOutput.h"
+#include "notes/songViewInput.h"
+#include "store/timeEditing.h"
 #include "store/workingFiles.h"
 
-int closeSong() {
-    int closed = closeSongStores();
+int closeSong(bool keepFiles) {
+    int closed = closeSongStores(keepFiles);
     resetNoteList();
     resetNoteRecognition();
     resetSelection();
     resetMidiImport();
     resetMidiOutput();
+    resetSongViewInput();
+    resetTimeClipboard();
     return closed;
 }

@@ -5,5 +5,6 @@
 
 // Empties the song's stores (store/workingFiles.h: closeSongStores), its note list, the
 // recognition state (the next song settles its own instruments and voice) and the selection.
-// 1 when every working file was removed.
-int closeSong();
+// 1 when every working file was removed. With keepFiles the working files stay in the shared
+// folder (melodrift-cli --keep-working-files); the memory is emptied all the same.
+int closeSong(bool keepFiles = false);

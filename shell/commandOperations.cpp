@@ -6,6 +6,10 @@
 #include "playback/midiImport.h"
 #include "playback/midiOutput.h"
 #include "playback/playback.h"
+#include "notes/songViewInput.h"
+#include "playback/midiOutput.h"
+#include "store/timeEditing.h"
+#include "store/undo.h"
 
 // Filled as their owners are built.
 CommandOperations commandOperations = [] {
@@ -16,5 +20,9 @@ CommandOperations commandOperations = [] {
     operations.toggleRecording = startRecording;
     operations.playSong = playSong;
     operations.pausePlayback = pausePlayback;
+    operations.handleSongViewCode = handleSongViewCode;
+    operations.canUndo = canUndo;
+    operations.canRedo = canRedo;
+    operations.clipboardKind = [] { return timeClipboard.kind; };
     return operations;
 }();

@@ -100,6 +100,9 @@ struct CommandEntry {
     const char* menuText;   // as the menu shows it; the key it names follows a "\t"
     int songViewCode;       // edit commands: the code the song view's edit operation takes; else 0
     bool songItem;          // greyed in menu 109, while no song is open
+    const char* scriptName; // the command's name in melodrift-cli scripts: the menu text in lower
+                            // case, words joined by hyphens, a value in brackets left to the
+                            // statement ("speed-up 10"); "" for commands scripts do not reach
 };
 
 // Every menu command, in menu order. The scanning commands are not in it.
@@ -107,6 +110,8 @@ extern const CommandEntry commandTable[];
 extern const int commandTableCount;
 // The row of id; nullptr for an id the menus do not hold.
 const CommandEntry* findCommand(int id);
+// The first row whose scriptName is name; nullptr for none.
+const CommandEntry* findScriptCommand(const std::string& name);
 // The menu text before its "\t" ("&Open..." for "&Open...\tCtrl+O"); "" for an unknown id.
 std::string commandLabel(int id);
 // The key named after the "\t" ("Ctrl+O"); "" when the text names none.

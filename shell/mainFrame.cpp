@@ -6,6 +6,7 @@
 #include "notes/displayModes.h"
 #include "playback/playback.h"
 #include "platform/ui.h"
+#include "playback/songViewGeometry.h"
 #include "shell/closeSong.h"
 #include "shell/commandOperations.h"
 #include "shell/commandTable.h"
@@ -32,7 +33,23 @@ void redrawSongView() {
 
 void songWindowOpened() { frameState.songWindowOpen = true; }
 
-const SongWindowHooks songWindowHooks = {showSongView, redrawSongView, updateFrameDisplay};
+static int songViewScrollX() { return songViewGeometry.scrollX; }
+
+static void scrollSongView(int x) {
+    setSongViewScroll(x, songViewGeometry.scrollY);
+    redrawSongView();
+}
+
+static void showTip(const char* tip);
+
+const SongWindowHooks songWindowHooks = {
+    .showSongView = showSongView,
+    .redrawSongView = redrawSongView,
+    .updateFrameDisplay = updateFrameDisplay,
+    .songViewScrollX = songViewScrollX,
+    .scrollSongView = scrollSongView,
+    .showTip = showTip,
+};
 
 void setFrameModal(bool on) {
     if (on) frameState.modalDepth++;

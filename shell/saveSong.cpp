@@ -66,6 +66,8 @@ int writeSongOutput(const std::string& path, bool onlySelectedRange) {
     if (!written) return 0;
     songNames.remembered[type] = path;
     songNames.lastSaved[type] = path;
+    // The whole song is on disk as it stands: the title no longer marks it as edited.
+    if (!onlySelectedRange) song.changed = false;
     return 1;
 }
 

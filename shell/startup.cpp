@@ -78,6 +78,7 @@ static void serveCaptureEvent() { handleCaptureNotification(); }
 int startUp(const StartupOptions& options) {
     appState = AppState{};
     appState.hooks = options.hooks;
+    appState.keepWorkingFiles = options.keepWorkingFiles;
     quitFlag = 0;
 
     if (appState.hooks.startGraphics && !appState.hooks.startGraphics()) {
@@ -132,7 +133,7 @@ int startUp(const StartupOptions& options) {
     // with the default voice.
     loadInstrumentDefinitions();
     createNamedMutexes();
-    emptyUndoFolder();
+    clearUndo();
     // A recording the last run did not finish is a take the user has sung: it is kept.
     recoverUnfinishedRecording();
     deleteWorkingFiles();
@@ -197,7 +198,7 @@ int shutDown(int exitCode) {
         area = nullptr;
     }
 
-    closeSong();
+    closeSong(appState.keepWorkingFiles);
     freeInstrumentDefinitions();
     undoState = UndoState{};
     closeNamedMutexes();

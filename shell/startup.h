@@ -22,6 +22,7 @@ struct StartupHooks {
 struct StartupOptions {
     std::string sharedBasePath;      // overrides the configured shared base path when not empty
     StartupHooks hooks;              // all null for the headless program
+    bool keepWorkingFiles = false;   // leave the song's working files in the shared folder at exit
 };
 
 // Process-wide state of the running program.
@@ -31,6 +32,7 @@ struct AppState {
     bool directSoundAvailable;       // the capture object was created
     void* workAreas[2];              // the two small start-up work areas
     StartupHooks hooks;              // as passed to startUp
+    bool keepWorkingFiles;           // as passed to startUp: shut-down leaves the working files
 };
 extern AppState appState;
 

@@ -20,6 +20,10 @@ void resetSong() {
     song.workingWaveBytes = 0;
     song.instrumentName.clear();
     song.notesOnly = false;
+    song.timeSignatureBeats = 4;
+    song.timeSignatureUnit = 4;
+    song.timeSignatureSymbol = 1;
+    song.changed = false;
 }
 
 int growSampleBlockDurations(uint32_t blocks) {
@@ -77,6 +81,12 @@ double snapTimeToBlock(double t, uint32_t startBlock, double startTime) {
 }
 
 double songDuration() { return songTimeOfBlock(song.blockCount); }
+
+uint32_t sampleOfBlock(uint32_t n) {
+    double samples = songTimeOfBlock(n) * song.waveFormat.samplesPerSec + 0.5;
+    if (!(samples > 0.0)) return 0;
+    return samples >= 4294967295.0 ? 0xFFFFFFFFu : uint32_t(samples);
+}
 
 SongNames songNames;
 

@@ -30,10 +30,16 @@ struct Song {
     bool notesOnly;                             // the notes came from a MIDI file and there is no
                                                 // recording: the blocks are only the notes' time axis,
                                                 // with no CS.fw, FT or Hires data (set by MIDI import)
+    uint32_t timeSignatureBeats = 4;            // upper number of the time signature (4; undo restores it)
+    uint32_t timeSignatureUnit = 4;             // lower number (4; undo restores it)
+    uint32_t timeSignatureSymbol = 1;           // 1 when the signature may be drawn as a symbol (undo restores it)
+    bool changed = false;                       // edited since it was opened (editing commands); the
+                                                // song window's title then ends in " *"
 };
 extern Song song;
 
-// Empties the song's memory: no blocks, no durations, format and instrument cleared.
+// Empties the song's memory: no blocks, no durations, format and instrument cleared, the time
+// signature of a new song (4/4, drawn as a symbol).
 void resetSong();
 
 // Makes room in sampleBlockDurations for at least blocks entries, growing in steps of
@@ -55,6 +61,9 @@ uint32_t blockAtTime(double t, uint32_t startBlock = 0, double startTime = 0.0, 
 double snapTimeToBlock(double t, uint32_t startBlock = 0, double startTime = 0.0);
 // The song's duration in seconds: songTimeOfBlock(blockCount).
 double songDuration();
+// The first sample of block n in CS.fw: the samples of the blocks before it, the time
+// songTimeOfBlock(n) at the song's rate, rounded.
+uint32_t sampleOfBlock(uint32_t n);
 
 // ---- the song's names ----
 // For each output Save can write (a wave, a MIDI or a detail MIDI file, OutputType of the

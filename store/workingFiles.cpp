@@ -38,8 +38,16 @@ int closeFTStore() {
     return deleted;
 }
 
-int closeSongStores() {
+int closeSongStores(bool keepFiles) {
     waitForUndoSnapshotWriter();
+    if (keepFiles) {
+        // The files stay for inspection; the next start-up clears them as usual.
+        closeFTFile(1);
+        freeFTBlockWindow();
+        freeHiresBuffers();
+        resetSong();
+        return clearUndo(true);
+    }
     int closed = 1;
     {
         std::lock_guard<std::mutex> guard(CSAccessWaveFileMutex);
@@ -48,7 +56,7 @@ int closeSongStores() {
     if (!closeFTStore()) closed = 0;
     freeHiresBuffers();
     resetSong();
-    if (!emptyUndoFolder()) closed = 0;
+    if (!clearUndo()) closed = 0;
     if (!deleteWorkingFiles()) closed = 0;
     return closed;
 }

@@ -13,6 +13,7 @@ int deleteWorkingFiles();
 int closeFTStore();
 // Empties the song's stores: waits for the undo snapshot writer, deletes CS.fw holding
 // CSAccessWaveFileMutex, empties the FT store and the Hires buffers, resets the song record
-// and its time axis, empties the undo folder and deletes the remaining working files. 1 when
-// everything was removed. Closing the song (shell/closeSong.h) also empties its notes.
-int closeSongStores();
+// and its time axis, clears the undo ring and deletes the remaining working files. 1 when
+// everything was removed. With keepFiles the memory is emptied and every file is left where
+// it is (for inspection after a run). Closing the song (shell/closeSong.h) also empties its notes.
+int closeSongStores(bool keepFiles = false);

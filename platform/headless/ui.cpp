@@ -16,6 +16,7 @@ struct HeadlessUiState {
     std::vector<UiCall> calls;        // every call since clearUiCalls
     std::deque<int> answers;          // preset answers of the next Yes/No boxes
     bool echo = false;                // copy boxes to stderr
+    std::vector<uint8_t> clipboard;   // the system clipboard's wave
 };
 static HeadlessUiState headlessUi;
 
@@ -94,7 +95,18 @@ void endProgress() {
 void beep() {
     if (installedBackend) return installedBackend->beep();
     record(UiCall{UI_BEEP, "", "", 0, 0, 0});
+    if (headlessUi.echo) std::fprintf(stderr, "%s (beep): nothing to do\n", MESSAGE_TITLE);
 }
+
+int setClipboardWave(const std::vector<uint8_t>& riffWave) {
+    if (installedBackend) return installedBackend->setClipboardWave(riffWave);
+    std::lock_guard<std::mutex> guard(headlessUi.lock);
+    headlessUi.clipboard = riffWave;
+    headlessUi.calls.push_back(UiCall{UI_CLIPBOARD, "", "", 0, 0, int(riffWave.size())});
+    return 1;
+}
+
+const std::vector<uint8_t>& clipboardWave() { return headlessUi.clipboard; }
 
 void setUiBackend(const UiBackend* backend) { installedBackend = backend; }
 

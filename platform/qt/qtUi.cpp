@@ -4,6 +4,8 @@
 #include "platform/qt/qtUi.h"
 
 #include <QApplication>
+#include <QClipboard>
+#include <QMimeData>
 #include <QLabel>
 #include <QMessageBox>
 #include <QPointer>
@@ -111,8 +113,20 @@ static void qtBeep() {
     onUi([] { QApplication::beep(); });
 }
 
-static const UiBackend qtUiBackend = {qtMessageBox,    qtSetWaitCursor, qtSetStatusText, qtBeginProgress,
-                                      qtStepProgress, qtEndProgress,   qtBeep};
+// The wave goes on the clipboard as audio/wav, the type other audio programs paste.
+static int qtSetClipboardWave(const std::vector<uint8_t>& riffWave) {
+    QByteArray bytes(reinterpret_cast<const char*>(riffWave.data()), qsizetype(riffWave.size()));
+    onUi([bytes] {
+        auto* data = new QMimeData;
+        data->setData("audio/wav", bytes);
+        data->setData("audio/x-wav", bytes);
+        QGuiApplication::clipboard()->setMimeData(data);
+    });
+    return 1;
+}
+
+static const UiBackend qtUiBackend = {qtMessageBox,   qtSetWaitCursor, qtSetStatusText, qtBeginProgress,
+                                      qtStepProgress, qtEndProgress,   qtBeep,          qtSetClipboardWave};
 
 void installQtUi() { setUiBackend(&qtUiBackend); }
 

@@ -53,7 +53,7 @@ static int backendBox(const std::string& title, const std::string&, int, int) {
 }
 
 TEST_F(HeadlessUi, AnInstalledBackendReceivesTheCallsInstead) {
-    UiBackend backend{backendBox, nullptr, nullptr, nullptr, nullptr, nullptr, nullptr};
+    UiBackend backend{backendBox, nullptr, nullptr, nullptr, nullptr, nullptr, nullptr, nullptr};
     setUiBackend(&backend);
     EXPECT_EQ(askYesNo("Replace?"), 0);
     setUiBackend(nullptr);
