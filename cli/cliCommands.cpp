@@ -30,6 +30,10 @@ const std::vector<CliCommand>& cliCommands() {
         {"record", "OUT.wav --seconds N [--from-file FILE [--fast]] [--notes-csv FILE] [--midi FILE]",
          "record N seconds from the default input (or a wave file fed in its place) and save the song and its notes",
          1, runRecordCommand},
+        {"run", "IN.wav (--script FILE | -e STATEMENTS)...",
+         "open a wave file and run an editing script on it: mode, select-notes, select-time, command, paste-at, "
+         "save-wave, save-midi, notes-csv, print-notes (one statement a line)",
+         3, runRunCommand},
         {"learn-instrument", "[--replace] [--output FILE] FILE...",
          "learn instrument definitions from recordings named with their parameters", 1, runLearnInstrumentCommand},
     };

@@ -37,5 +37,7 @@ int runPlayCommand(const std::vector<std::string>& arguments);
 // record OUT.wav --seconds N [--from-file FILE [--fast]] [--notes-csv FILE] [--midi FILE]: records
 // from the default input (or a wave file fed in its place) and saves the song and its notes.
 int runRecordCommand(const std::vector<std::string>& arguments);
+// run IN.wav (--script FILE | -e STATEMENTS)...: opens IN.wav and runs an editing script on it.
+int runRunCommand(const std::vector<std::string>& arguments);
 // learn-instrument [--replace] [--output FILE] FILE...: instrument definitions learnt from recordings.
 int runLearnInstrumentCommand(const std::vector<std::string>& arguments);

@@ -19,13 +19,16 @@ static const int EXIT_NOT_STARTED = 3;    // start-up stopped early (its message
 
 static void printUsage(FILE* out) {
     std::fprintf(out,
-                 "Usage: melodrift-cli [--shared DIR] [--config DIR] COMMAND ARGUMENTS...\n"
+                 "Usage: melodrift-cli [--shared DIR] [--config DIR] [--keep-working-files] COMMAND ARGUMENTS...\n"
                  "\n"
                  "Options:\n"
                  "  --shared DIR   keep the working files in DIR/Torvellan Shared/ instead of the\n"
                  "                 configured shared folder\n"
                  "  --config DIR   read and write the settings in DIR instead of the user's\n"
                  "                 configuration folder (same as MELODRIFT_CONFIG_DIR)\n"
+                 "  --keep-working-files\n"
+                 "                 leave the song's working files (CS.fw, the FT and Hires FT files,\n"
+                 "                 CSUndo) in the shared folder at exit; the next start clears them\n"
                  "\n"
                  "Commands:\n");
     // Each command on one line with its arguments, its summary indented below.
@@ -43,6 +46,11 @@ int main(int argc, char** argv) {
         if (option == "--help") {
             printUsage(stdout);
             return 0;
+        }
+        if (option == "--keep-working-files") {
+            options.keepWorkingFiles = true;
+            next++;
+            continue;
         }
         if (next + 1 >= words.size() || (option != "--shared" && option != "--config")) {
             std::fprintf(stderr, "melodrift-cli: unknown option or missing folder: %s\n\n", option.c_str());

@@ -5,6 +5,7 @@
 // as a MIDI file and the song's audio as a wave file. The analysis options are preferences
 // for this run only. `analyse` hands its --midi and --wave requests here.
 #include "cli/cliCommands.h"
+#include "cli/cliOutputs.h"
 
 #include <algorithm>
 #include <cstdio>
@@ -89,11 +90,6 @@ static bool parseOpenRequest(const std::vector<std::string>& arguments, OpenRequ
         return false;
     }
     return true;
-}
-
-static std::string noteName(int midiNote) {
-    static const char* const names[12] = {"C", "C#", "D", "D#", "E", "F", "F#", "G", "G#", "A", "A#", "B"};
-    return std::string(names[midiNote % 12]) + std::to_string(midiNote / 12 - 1);
 }
 
 static void printSummary(const OpenRequest& request) {
