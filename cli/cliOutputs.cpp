@@ -4,6 +4,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <filesystem>
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include "notes/noteList.h"
@@ -25,6 +26,10 @@ int writeOutputFile(const std::string& path, const std::string& input,
         showMessage(MESSAGE_ERROR, "Cannot " + path);
         return 0;
     }
+    // mkstemp makes the file private; an output gets the permissions of any new file of the user.
+    mode_t mask = umask(0);
+    umask(mask);
+    fchmod(descriptor, 0666 & ~mask);
     close(descriptor);
     std::string temporary = name.data();
     if (!write(temporary)) {

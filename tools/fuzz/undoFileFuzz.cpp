@@ -91,29 +91,15 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
 
 using Bytes = std::vector<uint8_t>;
 
-static void put32(Bytes& b, uint32_t v) {
-    for (int i = 0; i < 4; i++) b.push_back(uint8_t(v >> (8 * i)));
-}
-
-static void putFloat(Bytes& b, float v) {
-    uint32_t bits;
-    std::memcpy(&bits, &v, 4);
-    put32(b, bits);
-}
-
 // A level of count notes (of which stored are in the file) and the barlines.
 static Bytes level(const char* name, uint32_t count, uint32_t stored, const std::vector<float>& barlines) {
     Bytes b;
-    for (const char* c = name; *c; c++) {
-        b.push_back(uint8_t(*c));
-        b.push_back(0);
-    }
-    b.push_back(0);
-    b.push_back(0);
-    put32(b, 4);
-    put32(b, 4);
-    put32(b, 1);
-    put32(b, count);
+    for (const char* c = name; *c; c++) fuzzPut16(b, uint8_t(*c));
+    fuzzPut16(b, 0);
+    fuzzPut32(b, 4);
+    fuzzPut32(b, 4);
+    fuzzPut32(b, 1);
+    fuzzPut32(b, count);
     for (uint32_t i = 0; i < stored; i++) {
         Note n{};
         n.pitch = 220.0f * float(i + 1);
@@ -124,14 +110,14 @@ static Bytes level(const char* name, uint32_t count, uint32_t stored, const std:
         const uint8_t* p = reinterpret_cast<const uint8_t*>(&n);
         b.insert(b.end(), p, p + sizeof n);
     }
-    put32(b, uint32_t(barlines.size()));
-    for (float t : barlines) putFloat(b, t);
+    fuzzPut32(b, uint32_t(barlines.size()));
+    for (float t : barlines) fuzzPutFloat(b, t);
     return b;
 }
 
 static Bytes durations(const std::vector<double>& d) {
     Bytes b;
-    put32(b, uint32_t(d.size()));
+    fuzzPut32(b, uint32_t(d.size()));
     for (double x : d) {
         const uint8_t* p = reinterpret_cast<const uint8_t*>(&x);
         b.insert(b.end(), p, p + 8);
