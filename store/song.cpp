@@ -2,6 +2,7 @@
 // and are changed per block by timing edits, so the time of a block is always a sum of durations.
 #include "store/song.h"
 
+#include <algorithm>
 #include <cmath>
 
 #include "platform/allocation.h"
@@ -81,6 +82,38 @@ double snapTimeToBlock(double t, uint32_t startBlock, double startTime) {
 }
 
 double songDuration() { return songTimeOfBlock(song.blockCount); }
+
+BlockGrid makeBlockGrid() {
+    BlockGrid grid;
+    uint32_t count = song.blockCount;
+    grid.starts.resize(size_t(count) + 1);
+    double sum = 0.0;
+    for (uint32_t k = 0; k < count; k++) {
+        sum += blockDuration(k);
+        grid.starts[k + 1] = sum;
+    }
+    return grid;
+}
+
+double BlockGrid::snap(double t) const {
+    size_t count = starts.size() - 1;
+    if (count == 0) return 0.0;
+    double end = starts[count];
+    if (t < end) {
+        // Block k holds t (starts[k] <= t < starts[k + 1]; k = 0 before the song); the nearer
+        // boundary wins, half-way goes to the later one, as blockAtTime decides.
+        size_t k = size_t(std::upper_bound(starts.begin() + 1, starts.end(), t) - starts.begin()) - 1;
+        double toEnd = starts[k + 1] - t;
+        return toEnd > blockDuration(uint32_t(k)) / 2 ? starts[k] : starts[k + 1];
+    }
+    double duration = blockDuration(uint32_t(count - 1));
+    if (duration <= 0.0) return end;
+    double extra = t - end;
+    double whole = std::floor(extra / duration);
+    double toEnd = duration - (extra - whole * duration);
+    double blocks = toEnd > duration / 2 ? whole : whole + 1;
+    return end + blocks * duration;
+}
 
 uint32_t sampleOfBlock(uint32_t n) {
     double samples = songTimeOfBlock(n) * song.waveFormat.samplesPerSec + 0.5;

@@ -61,6 +61,14 @@ uint32_t blockAtTime(double t, uint32_t startBlock = 0, double startTime = 0.0, 
 double snapTimeToBlock(double t, uint32_t startBlock = 0, double startTime = 0.0);
 // The song's duration in seconds: songTimeOfBlock(blockCount).
 double songDuration();
+// The block boundaries summed once, for an operation that snaps many times (every note of a
+// long song) while the durations stay as they are: snap(t) gives snapTimeToBlock(t) by
+// bisection instead of a walk over the song.
+struct BlockGrid {
+    std::vector<double> starts;   // starts[k] = songTimeOfBlock(k), k = 0..blockCount
+    double snap(double t) const;
+};
+BlockGrid makeBlockGrid();
 // The first sample of block n in CS.fw: the samples of the blocks before it, the time
 // songTimeOfBlock(n) at the song's rate, rounded.
 uint32_t sampleOfBlock(uint32_t n);

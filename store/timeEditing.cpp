@@ -44,7 +44,8 @@ int timeRangeToBlocks(double start, double length, uint32_t* first, uint32_t* co
     return 1;
 }
 
-static float snap(double t) { return float(snapTimeToBlock(t)); }
+// A long song has many notes to move: they snap to a grid summed once per operation.
+static float snap(const BlockGrid& grid, double t) { return float(grid.snap(t)); }
 
 static void songChanged() {
     loadFTBlockWindow(0, 0);
@@ -56,6 +57,7 @@ static void songChanged() {
 // Notes and barlines after a cut of [t, t + L): those in it go, later ones move back by L.
 static void followRemoval(double t, double L) {
     double d = song.sampleBlockDuration;
+    BlockGrid grid = makeBlockGrid();
     for (int i = 0; i < noteList.count;) {
         Note& n = noteList.notes[i];
         if (n.waveStart + 1.5 * d >= t && n.waveEnd - 1.5 * d < t + L) {
@@ -63,10 +65,10 @@ static void followRemoval(double t, double L) {
             noteRemoved(i);
             continue;
         }
-        if (n.waveStart + 0.5 * d >= t) n.waveStart = snap(std::max(t, n.waveStart - L));
-        if (n.midiStart + 0.5 * d >= t) n.midiStart = snap(std::max(t, n.midiStart - L));
-        if (n.waveEnd + 0.5 * d >= t) n.waveEnd = snap(std::max({t, n.waveStart + 2 * d, n.waveEnd - L}));
-        if (n.midiEnd + 0.5 * d >= t) n.midiEnd = snap(std::max({t, n.midiStart + 2 * d, n.midiEnd - L}));
+        if (n.waveStart + 0.5 * d >= t) n.waveStart = snap(grid, std::max(t, n.waveStart - L));
+        if (n.midiStart + 0.5 * d >= t) n.midiStart = snap(grid, std::max(t, n.midiStart - L));
+        if (n.waveEnd + 0.5 * d >= t) n.waveEnd = snap(grid, std::max({t, n.waveStart + 2 * d, n.waveEnd - L}));
+        if (n.midiEnd + 0.5 * d >= t) n.midiEnd = snap(grid, std::max({t, n.midiStart + 2 * d, n.midiEnd - L}));
         i++;
     }
     for (int i = 0; i < barlineList.count;) {
@@ -76,7 +78,7 @@ static void followRemoval(double t, double L) {
             barlineRemoved(i);
             continue;
         }
-        if (b + 0.5 * d >= t) b = snap(std::max(t, b - L));
+        if (b + 0.5 * d >= t) b = snap(grid, std::max(t, b - L));
         i++;
     }
 }
@@ -145,23 +147,24 @@ int copyNotesAndBarlinesToClipboard(double start, double length) {
     double d = song.sampleBlockDuration;
     c.notes.clear();
     c.barlines.clear();
+    BlockGrid grid = makeBlockGrid();
+    float from = snap(grid, start), to = snap(grid, start + length);
     // In the order of the list, so that pasting meets them in time order.
     for (int i = 0; i < noteList.count && c.notes.size() < size_t(MAX_CS_NOTES); i++) {
         if (!isNoteSelected(i)) continue;
         Note n = noteList.notes[i];
         if (!(start <= n.midiEnd - 0.5 * d && start + length >= n.midiStart + 0.5 * d)) continue;
-        float from = snap(start), to = snap(start + length);
         n.waveStart = std::max(n.waveStart, from);
         n.midiStart = std::max(n.midiStart, from);
         n.waveEnd = std::min(n.waveEnd, to);
         n.midiEnd = std::min(n.midiEnd, to);
-        for (float* time : {&n.waveStart, &n.waveEnd, &n.midiStart, &n.midiEnd}) *time = snap(*time - start);
+        for (float* time : {&n.waveStart, &n.waveEnd, &n.midiStart, &n.midiEnd}) *time = snap(grid, *time - start);
         if (!tryAllocate([&] { c.notes.push_back(n); })) return 0;
     }
     for (int i = 0; i < barlineList.count && c.barlines.size() < size_t(MAX_CS_BARLINES); i++) {
         float b = barlineList.times[i];
         if (start <= b - 0.5 * d && start + length >= b + 0.5 * d)
-            if (!tryAllocate([&] { c.barlines.push_back(snap(b - start)); })) return 0;
+            if (!tryAllocate([&] { c.barlines.push_back(snap(grid, b - start)); })) return 0;
     }
     return 1;
 }
@@ -206,6 +209,7 @@ int copyTimeToClipboard(double start, double length) {
 // The song's notes and barlines around a paste of P seconds at t over [t, t + L).
 static void followPaste(double t, double L, double P, bool inserting) {
     double d = song.sampleBlockDuration;
+    BlockGrid grid = makeBlockGrid();
     for (int i = 0; i < noteList.count;) {
         Note& n = noteList.notes[i];
         if (n.waveStart + 1.5 * d >= t && t + L > n.waveEnd - 1.5 * d) {
@@ -219,17 +223,17 @@ static void followPaste(double t, double L, double P, bool inserting) {
         }
         Note before = n;
         bool straddles = n.waveStart < t - 0.5 * d && n.waveEnd > t + L + 0.5 * d;
-        if (t <= n.waveStart + 0.5 * d) n.waveStart = snap(std::max(t + P, n.waveStart + P - L));
-        if (t <= n.midiStart + 0.5 * d) n.midiStart = snap(std::max(t + P, n.midiStart + P - L));
-        if (t < n.waveEnd - 0.5 * d) n.waveEnd = snap(std::max({t + P, n.waveStart + 2 * d, n.waveEnd + P - L}));
-        if (t < n.midiEnd - 0.5 * d) n.midiEnd = snap(std::max({t + P, n.midiStart + 2 * d, n.midiEnd + P - L}));
+        if (t <= n.waveStart + 0.5 * d) n.waveStart = snap(grid, std::max(t + P, n.waveStart + P - L));
+        if (t <= n.midiStart + 0.5 * d) n.midiStart = snap(grid, std::max(t + P, n.midiStart + P - L));
+        if (t < n.waveEnd - 0.5 * d) n.waveEnd = snap(grid, std::max({t + P, n.waveStart + 2 * d, n.waveEnd + P - L}));
+        if (t < n.midiEnd - 0.5 * d) n.midiEnd = snap(grid, std::max({t + P, n.midiStart + 2 * d, n.midiEnd + P - L}));
         if (straddles && noteList.count < MAX_CS_NOTES) {
             // The note is cut at the paste point; its second part follows the pasted stretch.
             Note second = n;
-            second.waveStart = snap(t + P);
+            second.waveStart = snap(grid, t + P);
             second.midiStart = std::max(second.midiStart, second.waveStart);
             n = before;
-            n.waveEnd = snap(t);
+            n.waveEnd = snap(grid, t);
             n.midiEnd = std::min(n.midiEnd, n.waveEnd);
             insertNote(i + 1, second);
             noteInserted(i + 1);
@@ -245,7 +249,7 @@ static void followPaste(double t, double L, double P, bool inserting) {
             barlineRemoved(i);
             continue;
         }
-        if (inserting && b >= t - 0.5 * d) b = snap(std::max(t + P, b + P - L));
+        if (inserting && b >= t - 0.5 * d) b = snap(grid, std::max(t + P, b + P - L));
         i++;
     }
 }

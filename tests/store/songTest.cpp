@@ -74,6 +74,19 @@ TEST_F(TimeAxis, SnapPastTheEndGoesOnWithTheLastBlocksDuration) {
     EXPECT_DOUBLE_EQ(snapTimeToBlock(15.5 * D), 15 * D);
 }
 
+// The summed grid snaps as the walk does, before, inside and past the song, on uneven blocks.
+TEST_F(TimeAxis, TheBlockGridSnapsAsTheWalkDoes) {
+    makeSong(10);
+    song.sampleBlockDurations[2] = 2 * D;
+    song.sampleBlockDurations[3] = 0.5 * D;
+    song.sampleBlockDurations[9] = 3 * D;
+    BlockGrid grid = makeBlockGrid();
+    ASSERT_EQ(grid.starts.size(), 11u);
+    for (double t = -1.5 * D; t < 20 * D; t += 0.0625 * D) EXPECT_EQ(grid.snap(t), snapTimeToBlock(t)) << t / D << " D";
+    resetSong();
+    EXPECT_EQ(makeBlockGrid().snap(1.0), 0.0);
+}
+
 TEST_F(TimeAxis, AWalkMayStartFromAKnownBlockAndOffset) {
     makeSong(10);
     EXPECT_EQ(blockAtTime(5.1 * D, 5, 5 * D), 5u);
