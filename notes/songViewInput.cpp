@@ -132,8 +132,9 @@ static void paste() {
     getEditRange(start, end);
     if (start >= 0) {
         takeUndoSnapshot();
-        if (pasteTimeFromClipboard(start, std::max(0.0, end - start)))
-            markUndoStale(UNDO_FT_CHANGED | (kind == EDIT_RANGE_TIME ? UNDO_WAVE_CHANGED : 0));
+        // A paste that stops half-way has changed files all the same: the next snapshot copies them.
+        pasteTimeFromClipboard(start, std::max(0.0, end - start));
+        markUndoStale(UNDO_FT_CHANGED | (kind == EDIT_RANGE_TIME ? UNDO_WAVE_CHANGED : 0));
         song.changed = true;
     } else {
         songViewInput.pasteArmed = kind;
