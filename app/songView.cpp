@@ -201,6 +201,31 @@ bool SongView::event(QEvent* event) {
     return QAbstractScrollArea::event(event);
 }
 
+// A left click selects notes and barlines, or places an armed paste (notes/songViewInput.h).
+void SongView::mousePressEvent(QMouseEvent* event) {
+    if (event->button() != Qt::LeftButton) {
+        QAbstractScrollArea::mousePressEvent(event);
+        return;
+    }
+    setFocus();
+    QPoint at = event->position().toPoint();
+    updatePointerInfo(at.x(), at.y());
+    double time = xToTime(at.x());
+    time = time < 0 ? -1.0 : snapTimeToBlock(time);
+    int modifiers = 0;
+    if (event->modifiers() & Qt::ControlModifier) modifiers |= KEY_MODIFIER_CTRL;
+    if (event->modifiers() & Qt::ShiftModifier) modifiers |= KEY_MODIFIER_SHIFT;
+    if (event->modifiers() & Qt::AltModifier) modifiers |= KEY_MODIFIER_ALT;
+    songViewClick(time, modifiers);
+    if (MainFrame* frame = mainFrame()) {
+        frame->refreshSongWindow();
+        frame->refreshFrame();
+    } else {
+        songChanged();
+    }
+    event->accept();
+}
+
 void SongView::keyPressEvent(QKeyEvent* event) {
     // Playback's keys first: P plays or stops, Enter previews the selected note, and Escape
     // stops a playback before it clears anything.

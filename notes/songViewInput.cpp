@@ -220,6 +220,115 @@ static void scrollTo(int x) {
     repaint();
 }
 
+// ---- clicking ----
+
+static void pasteAtClick(double time) {
+    int kind = songViewInput.pasteArmed;
+    double at, length;
+    if (selection.pointerNote >= 0 && selection.pointerNote < noteList.count) {
+        const Note& n = noteList.notes[selection.pointerNote];
+        at = n.waveStart;
+        length = n.waveEnd - n.waveStart;
+    } else if (selection.pointerBarline < 0) {
+        at = time;
+        length = 0.0;
+    } else {
+        return;   // a barline under the pointer: the paste stays armed
+    }
+    takeUndoSnapshot();
+    timeClipboard.kind = kind;
+    pasteTimeFromClipboard(at, length);
+    markUndoStale(UNDO_FT_CHANGED | (kind == EDIT_RANGE_TIME ? UNDO_WAVE_CHANGED : 0));
+    song.changed = true;
+    songViewInput.pasteArmed = 0;
+    repaint();
+}
+
+// Removes entry position of a selection list of count entries.
+static void dropSelected(int* list, int& count, int position) {
+    std::copy(list + position + 1, list + count, list + position);
+    count--;
+}
+
+// The unbroken run of notes from the anchor (or, without one, the selected note farthest from
+// the clicked one) to note i becomes the selection.
+static void selectNoteRun(int i) {
+    int from = selection.anchorNote;
+    if (from < 0 || from >= noteList.count) {
+        from = i;
+        if (selection.selectedNoteCount > 0) {
+            int lo, hi;
+            selectedNoteRange(lo, hi);
+            from = i - lo > hi - i ? lo : hi;
+        }
+    }
+    int lo = std::min(from, i), hi = std::max(from, i);
+    selection.selectedNoteCount = 0;
+    for (int k = lo; k <= hi; k++) selectNote(k);
+    selection.anchorNote = from;
+    bool timeSelected = selection.timeSelectionStart >= 0 && selection.timeSelectionEnd > selection.timeSelectionStart;
+    if (displayModes.playbackMode == PLAYBACK_MODE_WAVE && timeSelected) {
+        selection.timeSelectionStart = std::min(selection.timeSelectionStart, noteList.notes[lo].waveStart);
+        selection.timeSelectionEnd = std::max(selection.timeSelectionEnd, noteList.notes[hi].waveEnd);
+    }
+}
+
+static void clickNote(int i, int modifiers) {
+    int position;
+    if (modifiers & KEY_MODIFIER_SHIFT) {
+        selectNoteRun(i);
+    } else if (modifiers & KEY_MODIFIER_CTRL) {
+        if (isNoteSelected(i, &position)) dropSelected(selection.selectedNotes, selection.selectedNoteCount, position);
+        else selectNote(i);
+        selection.anchorNote = i;
+    } else {
+        selectOnly(i);
+        selection.timeSelectionStart = NO_TIME_SELECTION;
+        selection.timeSelectionEnd = NO_TIME_SELECTION;
+    }
+}
+
+static void clickBarline(int i, int modifiers) {
+    int position;
+    if (modifiers & KEY_MODIFIER_SHIFT) {
+        int from = selection.anchorBarline >= 0 && selection.anchorBarline < barlineList.count ? selection.anchorBarline : i;
+        selection.selectedBarlineCount = 0;
+        for (int k = std::min(from, i); k <= std::max(from, i); k++) selectBarline(k);
+        selection.anchorBarline = from;
+    } else if (modifiers & KEY_MODIFIER_CTRL) {
+        if (isBarlineSelected(i, &position))
+            dropSelected(selection.selectedBarlines, selection.selectedBarlineCount, position);
+        else selectBarline(i);
+        selection.anchorBarline = i;
+    } else {
+        selection.selectedBarlineCount = 0;
+        selectBarline(i);
+        selection.anchorBarline = i;
+    }
+}
+
+void songViewClick(double time, int modifiers) {
+    if (songViewInput.dragKind != 0 || recordingOrOpeningActive()) return;
+    if (songViewInput.pasteArmed && time >= 0) {
+        pasteAtClick(time);
+        return;
+    }
+    int note = selection.pointerNote, barline = selection.pointerBarline;
+    if (note >= 0 && note < noteList.count) {
+        clickNote(note, modifiers);
+    } else {
+        selection.selectedNoteCount = 0;
+        selection.anchorNote = -1;
+    }
+    if (barline >= 0 && barline < barlineList.count) {
+        clickBarline(barline, modifiers);
+    } else {
+        selection.selectedBarlineCount = 0;
+        selection.anchorBarline = -1;
+    }
+    repaint();
+}
+
 int handleSongViewCode(int code) {
     bool busy = recordingOrOpeningActive();
     switch (code) {

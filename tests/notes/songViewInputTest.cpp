@@ -159,6 +159,49 @@ TEST_F(SongViewCodeTest, PasteWithoutASelectionArmsAndEscapeDisarms) {
     EXPECT_EQ(songViewInput.pasteArmed, 0);
 }
 
+TEST_F(SongViewCodeTest, ClicksSelectAloneToggleWithCtrlAndTakeARunWithShift) {
+    selection.timeSelectionStart = 0.1f;
+    selection.timeSelectionEnd = 0.3f;
+    struct Case {
+        int note;        // under the pointer; -1 none
+        int modifiers;
+        std::vector<int> selected;
+    } cases[] = {
+        {2, 0, {2}},
+        {4, KEY_MODIFIER_CTRL, {2, 4}},
+        {2, KEY_MODIFIER_CTRL, {4}},
+        {1, KEY_MODIFIER_SHIFT, {1, 2}},   // from the anchor, the note Ctrl last touched
+        {5, KEY_MODIFIER_SHIFT, {2, 3, 4, 5}},
+        {-1, 0, {}},
+    };
+    for (const Case& c : cases) {
+        selection.pointerNote = c.note;
+        songViewClick(1.0, c.modifiers);
+        EXPECT_EQ(selected(), c.selected) << "note " << c.note << " modifiers " << c.modifiers;
+    }
+    EXPECT_LT(selection.timeSelectionStart, 0.0f) << "a plain click on a note clears the time selection";
+}
+
+TEST_F(SongViewCodeTest, AnArmedPasteGoesWhereTheViewIsClickedAndUndoTakesItBack) {
+    selectNote(1);
+    selectionChanged();
+    handleSongViewCode(CODE_COPY);
+    resetSelection();
+    uint32_t blocks = song.blockCount;
+    handleSongViewCode(CODE_PASTE);
+    ASSERT_EQ(songViewInput.pasteArmed, EDIT_RANGE_TIME);
+    selection.pointerBarline = -1;
+    songViewClick(-1.0, 0);
+    EXPECT_EQ(song.blockCount, blocks) << "left of the notes nothing is pasted";
+    songViewClick(snapTimeToBlock(2.9), 0);
+    EXPECT_EQ(songViewInput.pasteArmed, 0);
+    EXPECT_EQ(song.blockCount, blocks + timeClipboard.durationCount);
+    EXPECT_NEAR(selection.timeSelectionStart, snapTimeToBlock(2.9), 1e-5) << "the pasted time is selected";
+    handleSongViewCode(CODE_UNDO);
+    waitForUndoSnapshotCopy();
+    EXPECT_EQ(song.blockCount, blocks);
+}
+
 TEST_F(SongViewCodeTest, EscapeClearsTheSelectionAndTheTip) {
     selectNote(2);
     selectionChanged();
