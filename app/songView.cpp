@@ -1,6 +1,7 @@
 // The song view's drawing window.
 #include "app/songView.h"
 
+#include <cmath>
 #include <mutex>
 
 #include <QKeyEvent>
@@ -11,6 +12,7 @@
 
 #include "app/mainFrame.h"
 #include "app/songViewPainter.h"
+#include "analysis/pitchScale.h"
 #include "audio/audioActivity.h"
 #include "notes/displayModes.h"
 #include "notes/noteList.h"
@@ -124,32 +126,22 @@ static void runFrameCommand(int id) {
     else dispatchCommand(id);
 }
 
-// A click on a note selects it alone and plays it; a click beside the notes clears the note
-// selection. Playback stops either way.
-void SongView::mousePressEvent(QMouseEvent* event) {
-    if (event->button() != Qt::LeftButton || recordingOrOpeningActive()) {
-        QAbstractScrollArea::mousePressEvent(event);
-        return;
-    }
-    QPointF at = event->position();
-    int hit = -1;
-    if (at.y() < viewport()->height() - PLOT_BOTTOM_MARGIN)
-        for (int i = 0; i < noteList.count && hit < 0; i++)
-            if (noteBarRect(i).adjusted(-1, -2, 1, 2).contains(at)) hit = i;
-    stopPlayback();
-    selection.selectedNoteCount = 0;
-    selection.pointerNote = hit;
-    if (hit >= 0) {
-        selectNote(hit);
-        selection.timeSelectionStart = selection.timeSelectionEnd = NO_TIME_SELECTION;
-        previewNote(hit);
-    }
-    redrawSongView();
-    event->accept();
+// What lies under the pointer at (x, y) of the view, as the painter draws it: the note whose
+// bar holds the point, and a barline within 3 pixels.
+static void trackPointer(int x, int y, int height) {
+    Selection& s = selection;
+    s.pointerNote = -1;
+    s.pointerBarline = -1;
+    if (x < songViewGeometry.plotLeft || y >= height - PLOT_BOTTOM_MARGIN) return;
+    for (int i = 0; i < noteList.count && s.pointerNote < 0; i++)
+        if (noteBarRect(i).adjusted(-1, -2, 1, 2).contains(QPointF(x, y))) s.pointerNote = i;
+    for (int i = 0; i < barlineList.count; i++)
+        if (std::abs(x - timeToX(barlineList.times[i])) <= 3) s.pointerBarline = i;
 }
 
 void SongView::mouseMoveEvent(QMouseEvent* event) {
     QPoint at = event->position().toPoint();
+    trackPointer(at.x(), at.y(), viewport()->height());
     updatePointerInfo(at.x(), at.y());
     viewport()->update(QRect(0, viewport()->height() - PLOT_BOTTOM_MARGIN, viewport()->width(), PLOT_BOTTOM_MARGIN));
     QAbstractScrollArea::mouseMoveEvent(event);
@@ -201,15 +193,19 @@ bool SongView::event(QEvent* event) {
     return QAbstractScrollArea::event(event);
 }
 
-// A left click selects notes and barlines, or places an armed paste (notes/songViewInput.h).
+// A left click selects notes and barlines, or places an armed paste (notes/songViewInput.h);
+// playback stops first, and a note clicked alone is played.
 void SongView::mousePressEvent(QMouseEvent* event) {
-    if (event->button() != Qt::LeftButton) {
+    if (event->button() != Qt::LeftButton || recordingOrOpeningActive()) {
         QAbstractScrollArea::mousePressEvent(event);
         return;
     }
     setFocus();
+    stopPlayback();
     QPoint at = event->position().toPoint();
+    trackPointer(at.x(), at.y(), viewport()->height());
     updatePointerInfo(at.x(), at.y());
+    bool pasting = songViewInput.pasteArmed != 0;
     double time = xToTime(at.x());
     time = time < 0 ? -1.0 : snapTimeToBlock(time);
     int modifiers = 0;
@@ -217,6 +213,7 @@ void SongView::mousePressEvent(QMouseEvent* event) {
     if (event->modifiers() & Qt::ShiftModifier) modifiers |= KEY_MODIFIER_SHIFT;
     if (event->modifiers() & Qt::AltModifier) modifiers |= KEY_MODIFIER_ALT;
     songViewClick(time, modifiers);
+    if (!pasting && modifiers == 0 && selection.pointerNote >= 0) previewNote(selection.pointerNote);
     if (MainFrame* frame = mainFrame()) {
         frame->refreshSongWindow();
         frame->refreshFrame();

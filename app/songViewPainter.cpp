@@ -63,6 +63,12 @@ const SongViewColours& songViewColours() {
     return colours;
 }
 
+double noteBarHeight() {
+    const SongViewGeometry& geo = songViewGeometry;
+    double spacing = (geo.scaleMode & SCALE_MODE_DIATONIC) ? diatonicPixelsPerStep() / 2 : chromaticPixelsPerSemitone();
+    return std::clamp(spacing - 1, 4.0, 14.0);
+}
+
 namespace {
 
 struct Painting {
@@ -161,12 +167,6 @@ void paintBarlines(Painting& p) {
         p.g.setPen(QPen(selected ? p.c.selectedBarline : p.c.barline, selected ? 3 : 1.5));
         p.g.drawLine(QPointF(x + 0.5, 0), QPointF(x + 0.5, bottom));
     }
-}
-
-double noteBarHeight() {
-    const SongViewGeometry& geo = songViewGeometry;
-    double spacing = (geo.scaleMode & SCALE_MODE_DIATONIC) ? diatonicPixelsPerStep() / 2 : chromaticPixelsPerSemitone();
-    return std::clamp(spacing - 1, 4.0, 14.0);
 }
 
 void paintNoteBar(Painting& p, const QRectF& r, bool selected) {

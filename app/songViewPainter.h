@@ -43,6 +43,10 @@ struct SongViewColours {
 };
 const SongViewColours& songViewColours();
 
+// The height of a note bar in pixels at the present layout and zoom: the painter draws the
+// bars with it and the view finds the note under the pointer with it.
+double noteBarHeight();
+
 // Lays the view out for the image's size and paints the whole drawing window into image,
 // under the drawing lock. The drawing settings switch anti-aliasing, translucent fills and
 // gradients. 0 when the image cannot be painted on (the caller shows the display problem).

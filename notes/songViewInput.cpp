@@ -3,12 +3,14 @@
 #include "notes/songViewInput.h"
 
 #include <algorithm>
+#include <iterator>
 
 #include "audio/audioActivity.h"
 #include "audio/openWaveFile.h"
 #include "notes/displayModes.h"
 #include "notes/selection.h"
 #include "notes/songViewKeys.h"
+#include "playback/playback.h"
 #include "playback/songViewGeometry.h"
 #include "resources/strings.h"
 #include "store/song.h"
@@ -331,6 +333,9 @@ void songViewClick(double time, int modifiers) {
 
 int handleSongViewCode(int code) {
     bool busy = recordingOrOpeningActive();
+    // What plays must not go on over a song that changes under it.
+    static const int changing[] = {CODE_BACKSPACE, CODE_DELETE, CODE_CUT, CODE_PASTE, CODE_UNDO, CODE_REDO, CODE_SELECT_ALL};
+    if (!busy && std::find(std::begin(changing), std::end(changing), code) != std::end(changing)) stopPlayback();
     switch (code) {
     case CODE_BACKSPACE:
     case CODE_DELETE:

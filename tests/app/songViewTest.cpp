@@ -26,6 +26,7 @@
 #include "playback/playbackState.h"
 #include "playback/pointerInfo.h"
 #include "playback/songViewGeometry.h"
+#include "notes/selection.h"
 #include "shell/commandTable.h"
 #include "store/ftBlockStore.h"
 
@@ -210,6 +211,35 @@ private slots:
         QCOMPARE(songViewGeometry.scrollY, 50);
         QCOMPARE(window.toolbarButton(3)->text(), QString("Play"));
         QCOMPARE(window.toolbarButton(1)->text(), QString("Detail"));
+    }
+
+    // Clicks on the note bars select as the view's click rules say; the edit keys reach the view.
+    void clicksAndEditKeysSelectNotes() {
+        makeSong(512, 3);
+        SongWindow window;
+        window.resize(800, 600);
+        window.show();
+        QVERIFY(QTest::qWaitForWindowExposed(&window));
+        SongView* view = window.songView();
+        auto noteAt = [](int i) {
+            const Note& n = noteList.notes[i];
+            return QPoint(timeToX((n.waveStart + n.waveEnd) / 2), pitchToY(pitchToFrequency(n.midiNote)));
+        };
+        auto selected = [] {
+            return std::vector<int>(selection.selectedNotes, selection.selectedNotes + selection.selectedNoteCount);
+        };
+        QTest::mouseClick(view->viewport(), Qt::LeftButton, Qt::NoModifier, noteAt(1));
+        QCOMPARE(selected(), std::vector<int>({1}));
+        QTest::mouseClick(view->viewport(), Qt::LeftButton, Qt::ControlModifier, noteAt(2));
+        QCOMPARE(selected(), std::vector<int>({1, 2}));
+        QTest::keyClick(view, Qt::Key_Escape);
+        QCOMPARE(selected(), std::vector<int>());
+        QTest::keyClick(view, Qt::Key_A, Qt::ControlModifier);
+        QCOMPARE(selected(), std::vector<int>({0, 1, 2}));
+        QTest::keyClick(view, Qt::Key_Escape);
+        QTest::keyClick(view, Qt::Key_Tab);
+        QTest::keyClick(view, Qt::Key_Tab);
+        QCOMPARE(selected(), std::vector<int>({1}));
     }
 
     void theZoomCommandsActOnTheView() {
