@@ -1,7 +1,10 @@
 // The Qt backends of the platform layer: boxes titled as the program titles them with the
 // icon of their kind, Yes/No answers, the status text, the progress window, and the main
 // loop's posted calls, quit code, capture event and timers on Qt's event loop.
+#include <QClipboard>
+#include <QGuiApplication>
 #include <QLabel>
+#include <QMimeData>
 #include <QProgressDialog>
 #include <QThread>
 #include <QtTest>
@@ -65,6 +68,16 @@ private slots:
         worker.join();
         QCOMPARE(answer, 1);
         QCOMPARE(box.text, QString("Load the rest of the file?"));
+    }
+
+    void aCopiedWaveReachesTheSystemClipboardAsAudioWav() {
+        installQtUi();
+        const std::vector<uint8_t> wave = {'R', 'I', 'F', 'F', 4, 0, 0, 0, 'W', 'A', 'V', 'E'};
+        QCOMPARE(setClipboardWave(wave), 1);
+        const QClipboard* clipboard = QGuiApplication::clipboard();
+        QTRY_VERIFY(clipboard->mimeData() && clipboard->mimeData()->hasFormat("audio/wav"));
+        QByteArray held = clipboard->mimeData()->data("audio/wav");
+        QCOMPARE(held, QByteArray(reinterpret_cast<const char*>(wave.data()), qsizetype(wave.size())));
     }
 
     void statusTextGoesToTheSecondPartAndProgressToItsWindow() {
