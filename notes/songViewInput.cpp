@@ -268,11 +268,6 @@ static void selectNoteRun(int i) {
     selection.selectedNoteCount = 0;
     for (int k = lo; k <= hi; k++) selectNote(k);
     selection.anchorNote = from;
-    bool timeSelected = selection.timeSelectionStart >= 0 && selection.timeSelectionEnd > selection.timeSelectionStart;
-    if (displayModes.playbackMode == PLAYBACK_MODE_WAVE && timeSelected) {
-        selection.timeSelectionStart = std::min(selection.timeSelectionStart, noteList.notes[lo].waveStart);
-        selection.timeSelectionEnd = std::max(selection.timeSelectionEnd, noteList.notes[hi].waveEnd);
-    }
 }
 
 static void clickNote(int i, int modifiers) {
@@ -285,8 +280,6 @@ static void clickNote(int i, int modifiers) {
         selection.anchorNote = i;
     } else {
         selectOnly(i);
-        selection.timeSelectionStart = NO_TIME_SELECTION;
-        selection.timeSelectionEnd = NO_TIME_SELECTION;
     }
 }
 
@@ -328,6 +321,9 @@ void songViewClick(double time, int modifiers) {
         selection.selectedBarlineCount = 0;
         selection.anchorBarline = -1;
     }
+    // The old stretch goes; the time selection covers the clicked notes, as after the
+    // selection keys, so that Delete, Cut and Copy in Wave mode act on the notes' time.
+    extendTimeSelectionToNotes(true);
     repaint();
 }
 

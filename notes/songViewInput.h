@@ -24,11 +24,10 @@ int handleSongViewCode(int code);
 // A click in the note area at time (snapped to a block boundary; negative left of the notes),
 // with the KEY_MODIFIER_* bits held, over what selection.pointerNote and pointerBarline name.
 // With a paste armed it pastes there: over the pointed note's wave span, or at time when no
-// note or barline is under the pointer. Otherwise it selects: a note alone (the time
-// selection cleared), Ctrl adds or removes it, Shift takes the unbroken run from the
-// selection's anchor to it (in Wave mode widening a time selection to the run); a click off
-// the notes clears the note selection. Barlines follow the same rules. Nothing happens while
-// a drag, a recording or an opening runs.
+// note or barline is under the pointer. Otherwise it selects: a note alone, Ctrl adds or
+// removes it, Shift takes the unbroken run from the selection's anchor to it; a click off the
+// notes clears the note selection; the time selection then covers exactly the selected notes.
+// Barlines follow the same rules. Nothing happens while a drag, a recording or an opening runs.
 void songViewClick(double time, int modifiers);
 
 // The view's tip after a paste of kind (3 or 4).

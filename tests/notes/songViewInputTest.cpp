@@ -178,8 +178,23 @@ TEST_F(SongViewCodeTest, ClicksSelectAloneToggleWithCtrlAndTakeARunWithShift) {
         selection.pointerNote = c.note;
         songViewClick(1.0, c.modifiers);
         EXPECT_EQ(selected(), c.selected) << "note " << c.note << " modifiers " << c.modifiers;
+        // The time selection covers exactly the selected notes, or nothing.
+        float start = c.selected.empty() ? NO_TIME_SELECTION : noteList.notes[c.selected.front()].waveStart;
+        float end = c.selected.empty() ? NO_TIME_SELECTION : noteList.notes[c.selected.back()].waveEnd;
+        EXPECT_EQ(selection.timeSelectionStart, start) << "note " << c.note;
+        EXPECT_EQ(selection.timeSelectionEnd, end) << "note " << c.note;
     }
-    EXPECT_LT(selection.timeSelectionStart, 0.0f) << "a plain click on a note clears the time selection";
+}
+
+TEST_F(SongViewCodeTest, AClickedNoteIsDeletedWithItsTimeInWaveMode) {
+    displayModes.playbackMode = PLAYBACK_MODE_WAVE;
+    uint32_t blocks = song.blockCount;
+    uint32_t noteBlocks = blockAtTime(noteList.notes[2].waveEnd) - blockAtTime(noteList.notes[2].waveStart);
+    selection.pointerNote = 2;
+    songViewClick(1.0, 0);
+    handleSongViewCode(CODE_DELETE);
+    EXPECT_EQ(song.blockCount, blocks - noteBlocks);
+    EXPECT_EQ(noteList.count, 5);
 }
 
 TEST_F(SongViewCodeTest, AnArmedPasteGoesWhereTheViewIsClickedAndUndoTakesItBack) {
