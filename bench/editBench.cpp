@@ -24,41 +24,11 @@
 #include "store/song.h"
 #include "store/timeEditing.h"
 #include "store/undo.h"
-#include "tests/analysis/signalGenerator.h"
 
 static const int RUNS = 5;
 
 static double wallSeconds() {
     return std::chrono::duration<double>(std::chrono::steady_clock::now().time_since_epoch()).count();
-}
-
-static void putLittle(std::vector<uint8_t>& b, uint32_t v, int bytes) {
-    for (int i = 0; i < bytes; i++) b.push_back(uint8_t(v >> (8 * i)));
-}
-
-static bool writeMelodyWave(const std::string& path, double seconds) {
-    uint32_t samples = uint32_t(seconds * 44100);
-    std::vector<uint8_t> file;
-    file.insert(file.end(), {'R', 'I', 'F', 'F'});
-    putLittle(file, 36 + samples * 2, 4);
-    file.insert(file.end(), {'W', 'A', 'V', 'E', 'f', 'm', 't', ' '});
-    putLittle(file, 16, 4);
-    putLittle(file, 1, 2);
-    putLittle(file, 1, 2);
-    putLittle(file, 44100, 4);
-    putLittle(file, 88200, 4);
-    putLittle(file, 2, 2);
-    putLittle(file, 16, 2);
-    file.insert(file.end(), {'d', 'a', 't', 'a'});
-    putLittle(file, samples * 2, 4);
-    size_t header = file.size();
-    file.resize(header + size_t(samples) * 2);
-    MelodyGenerator generator;
-    generator.fill16(file.data() + header, samples);
-    FILE* out = std::fopen(path.c_str(), "wb");
-    if (!out) return false;
-    bool written = std::fwrite(file.data(), 1, file.size(), out) == file.size();
-    return std::fclose(out) == 0 && written;
 }
 
 // Opens a melody of seconds as the program does; false when the song is not there.
