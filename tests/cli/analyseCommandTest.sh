@@ -8,7 +8,8 @@ set -u
 cli=$1
 wave=$2
 truth=${wave%.wav}.notes.csv
-. "$(dirname "$0")/cliTestSupport.sh" melodrift-cli-test
+test_name=melodrift-cli-test
+. "$(dirname "$0")/cliTestSupport.sh"
 
 run analyse "$wave" --notes-csv "$work/notes.csv" --pitch-csv "$work/pitch.csv" --ft-csv "$work/ft.csv" \
     >"$work/out.txt" 2>"$work/err.txt" || fail "analyse of the demo exited with $?: $(cat "$work/err.txt")"

@@ -8,7 +8,8 @@ set -u
 cli=$1
 midi=$2
 truth=${midi%.mid}.notes.csv
-. "$(dirname "$0")/cliTestSupport.sh" melodrift-cli-midi
+test_name=melodrift-cli-midi
+. "$(dirname "$0")/cliTestSupport.sh"
 
 run open "$midi" --notes-csv "$work/notes.csv" --midi "$work/again.mid" >"$work/out.txt" 2>"$work/err.txt" \
     || fail "open of the demo's MIDI file exited with $?: $(cat "$work/err.txt")"
