@@ -6,11 +6,12 @@
 
 #include "audio/audioActivity.h"
 #include "audio/openWaveFile.h"
+#include "cli/cliOutputs.h"
 #include "notes/noteList.h"
 #include "platform/files.h"
 #include "platform/ui.h"
-#include "store/song.h"
 #include "shell/closeSong.h"
+#include "store/song.h"
 
 const std::vector<CliCommand>& cliCommands() {
     static const std::vector<CliCommand> commands = {
@@ -75,12 +76,7 @@ int writeSongNotesCsv(const std::string& path) {
         showMessage(MESSAGE_ERROR, "Cannot " + path);
         return 0;
     }
-    std::fprintf(csv, "onset_s,offset_s,midi_pitch,pitch_hz,volume_sum\n");
-    for (int i = 0; i < noteList.count; i++) {
-        const Note& n = noteList.notes[i];
-        std::fprintf(csv, "%.4f,%.4f,%u,%.2f,%u\n", double(n.waveStart), double(n.waveEnd), unsigned(n.midiNote),
-                     double(n.pitch), n.volumeSum);
-    }
+    writeNotesRows(csv);
     bool failed = std::ferror(csv) != 0;
     if (fileClose(csv) != 0 || failed || renameFile(temporary, path) != 0) {
         fileDelete(temporary);

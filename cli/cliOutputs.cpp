@@ -44,18 +44,22 @@ int writeOutputFile(const std::string& path, const std::string& input,
     return 1;
 }
 
-int writeNotesTable(const std::string& path) {
-    FILE* csv = fileOpen(path, "w");
-    if (!csv) {
-        showMessage(MESSAGE_ERROR, "Cannot " + path);
-        return 0;
-    }
+void writeNotesRows(FILE* csv) {
     std::fprintf(csv, "onset_s,offset_s,midi_pitch,pitch_hz,volume_sum\n");
     for (int i = 0; i < noteList.count; i++) {
         const Note& n = noteList.notes[i];
         std::fprintf(csv, "%.4f,%.4f,%u,%.2f,%u\n", double(n.waveStart), double(n.waveEnd), unsigned(n.midiNote),
                      double(n.pitch), n.volumeSum);
     }
+}
+
+int writeNotesTable(const std::string& path) {
+    FILE* csv = fileOpen(path, "w");
+    if (!csv) {
+        showMessage(MESSAGE_ERROR, "Cannot " + path);
+        return 0;
+    }
+    writeNotesRows(csv);
     bool failed = std::ferror(csv) != 0;
     if (fileClose(csv) != 0 || failed) {
         showMessage(MESSAGE_ERROR, "Cannot " + path);

@@ -3,6 +3,7 @@
 // and as a printed list, and every output file through a temporary file renamed over its
 // name once complete, never over the file being read.
 
+#include <cstdio>
 #include <functional>
 #include <string>
 
@@ -11,7 +12,10 @@
 // the input file itself. 1 when path holds the new output.
 int writeOutputFile(const std::string& path, const std::string& input,
                     const std::function<int(const std::string& temporary)>& write);
-// The notes as CSV, onset_s,offset_s,midi_pitch,pitch_hz,volume_sum, one row per note. 1 written.
+// The notes table into an open file: the header onset_s,offset_s,midi_pitch,pitch_hz,volume_sum
+// and one row per note.
+void writeNotesRows(FILE* csv);
+// The notes as CSV (writeNotesRows) at path. 1 written.
 int writeNotesTable(const std::string& path);
 // Prints every note: its index, wave span, name, pitch and volume sum.
 void printNoteList();
